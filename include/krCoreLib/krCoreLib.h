@@ -1,0 +1,22 @@
+// krCoreLib: the whole public interface in one include.
+#pragma once
+
+#include <krCoreLib/core/KRExport.h>
+#include <krCoreLib/core/CKRDebugOutput.h>
+#include <krCoreLib/core/CKRSingleton.h>
+#include <krCoreLib/core/CKRString.h>
+
+#include <krCoreLib/platform/KRBStr.h>
+#include <krCoreLib/platform/KRGuidDef.h>
+
+#include <krCoreLib/objectmodel/CKRGuid.h>
+#include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
+#include <krCoreLib/objectmodel/CKRObjPtrList.h>
+#include <krCoreLib/objectmodel/CKRObjectImpl.h>
+#include <krCoreLib/objectmodel/CKRObjectTypeImpl.h>
+#include <krCoreLib/objectmodel/CKRTypeRepository.h>
+#include <krCoreLib/objectmodel/CKRTypeSystem.h>
+#include <krCoreLib/objectmodel/IKRCollection.h>
+#include <krCoreLib/objectmodel/IKRObject.h>
+#include <krCoreLib/objectmodel/IKRObjectType.h>
+#include <krCoreLib/objectmodel/KRObjectTypeMacros.h>

@@ -1,0 +1,109 @@
+// CKRObjGuidPtrMap: object pointers keyed by instance ID.
+//
+// Each element is stored under its instance ID at the time it was added, in
+// ascending ID order (the order of CKRGuid). The map does not own its
+// elements: removing one never destroys it; only RemoveAll(true) asks each
+// element to Release() itself. `T` is IKRObject or a class derived from it;
+// through the IKRCollection view an element of another class is refused.
+// Not synchronised.
+#pragma once
+
+#include <krCoreLib/objectmodel/IKRCollection.h>
+
+#include <map>
+#include <type_traits>
+
+template <class T>
+class CKRObjGuidPtrMap : public IKRCollection {
+  static_assert(std::is_base_of_v<IKRObject, T>, "elements are framework objects");
+  using Map = std::map<CKRGuid, T*>;
+
+public:
+  // Ascending instance ID.
+  class Iterator : public IKRIterator {
+  public:
+    Iterator() = default;
+    explicit Iterator(CKRObjGuidPtrMap* map) : m_pMap(map) { Reset(1); }
+    T* Next(int restart) override {
+      if (restart)
+        Reset(1);
+      if (m_pMap == nullptr || m_Position == m_pMap->m_Map.end())
+        return nullptr;
+      return (m_Position++)->second;
+    }
+    void Reset(int reset) override {
+      if (reset && m_pMap != nullptr)
+        m_Position = m_pMap->m_Map.begin();
+    }
+    bool IsValid() const override { return m_pMap != nullptr; }
+
+  private:
+    typename Map::iterator m_Position{};
+    CKRObjGuidPtrMap* m_pMap = nullptr;
+  };
+
+  int GetCount() const override { return static_cast<int>(m_Map.size()); }
+
+  T* Find(CKRGuid instanceID) override {
+    const auto at = m_Map.find(instanceID);
+    return at == m_Map.end() ? nullptr : at->second;
+  }
+
+  // With `release` false, empties the map. With `release` true, takes the
+  // entries in ascending ID order, erasing each before releasing its element.
+  void RemoveAll(bool release) override {
+    if (!release) {
+      m_Map.clear();
+      return;
+    }
+    while (!m_Map.empty()) {
+      const auto first = m_Map.begin();
+      T* element = first->second;
+      if (element == nullptr)
+        break;
+      m_Map.erase(first);
+      element->Release();
+    }
+  }
+
+  // 0 for null, for an element that is not a T and when an element is
+  // already stored under the element's instance ID.
+  int Add(IKRObject* element) override {
+    T* typed = Cast(element);
+    if (typed == nullptr)
+      return 0;
+    return m_Map.try_emplace(element->GetInstanceID(), typed).second ? 1 : 0;
+  }
+
+  // Removes the entry under the element's instance ID when it holds this
+  // very element. Another object with the same ID (two live objects may
+  // share one) keeps its entry, and the result is null.
+  T* Remove(IKRObject* element) override {
+    if (element == nullptr)
+      return nullptr;
+    const auto at = m_Map.find(element->GetInstanceID());
+    if (at == m_Map.end() || static_cast<IKRObject*>(at->second) != element)
+      return nullptr;
+    T* removed = at->second;
+    m_Map.erase(at);
+    return removed;
+  }
+
+  Iterator GetIterator() { return Iterator(this); }
+
+  // Read-only walk over (instance ID, element) pairs for range-for loops.
+  typename Map::const_iterator begin() const { return m_Map.begin(); }
+  typename Map::const_iterator end() const { return m_Map.end(); }
+
+private:
+  static T* Cast(IKRObject* element) {
+    if constexpr (std::is_same_v<T, IKRObject>)
+      return element;
+    else
+      return dynamic_cast<T*>(element);
+  }
+
+  Map m_Map;
+};
+
+extern template class KRCORELIB_API CKRObjGuidPtrMap<IKRObject>;
