@@ -90,7 +90,7 @@ public:
   void SetEmpty() noexcept { m_Guid = GUID{}; }
   // Copies the value out into `guid` (the object is not changed).
   void SetGUID(GUID& guid) const noexcept { guid = m_Guid; }
-  const GUID& GetGUID() const noexcept { return m_Guid; }
+  constexpr const GUID& GetGUID() const noexcept { return m_Guid; }
 
   int IsValid() const noexcept { return IsNull() ? 0 : 1; }
   int IsNull() const noexcept {
