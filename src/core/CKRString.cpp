@@ -177,7 +177,8 @@ CKRString& CKRString::MakeLower() noexcept {
 }
 
 CKRString CKRString::Left(int count) const {
-  return Mid(0, count);
+  // A negative count clamps to none; Mid would read it as "to the end".
+  return Mid(0, std::max(count, 0));
 }
 
 CKRString CKRString::Right(int count) const {

@@ -45,16 +45,17 @@ class KRCORELIB_API CKRSingletonT : public TBase {
 public:
   // The instance, created on first use.
   static TClass* GetInstance() {
-    TClass* instance = m_pInstance.load(std::memory_order_acquire);
+    CKRSingletonT* instance = m_pInstance.load(std::memory_order_acquire);
     if (instance != nullptr)
-      return instance;
+      return static_cast<TClass*>(instance);
     std::lock_guard<std::recursive_mutex> guard(CKRSingleton::GetLock());
     instance = m_pInstance.load(std::memory_order_relaxed);
     if (instance == nullptr) {
-      instance = new TClass();
-      m_pInstance.store(instance, std::memory_order_release);
+      TClass* created = new TClass();
+      m_pInstance.store(created, std::memory_order_release);
+      return created;
     }
-    return instance;
+    return static_cast<TClass*>(instance);
   }
 
   // True when the instance exists; never creates it.
@@ -63,19 +64,21 @@ public:
   // Releases the instance if it exists; a later GetInstance creates a new one.
   static void ReleaseInstance() {
     std::lock_guard<std::recursive_mutex> guard(CKRSingleton::GetLock());
-    if (TClass* instance = m_pInstance.load(std::memory_order_relaxed))
-      static_cast<CKRSingletonT*>(instance)->Release();
+    if (CKRSingletonT* instance = m_pInstance.load(std::memory_order_relaxed))
+      instance->Release();
   }
 
 protected:
   CKRSingletonT() = default;
   ~CKRSingletonT() override {
     // However the instance ends (ReleaseInstance, ReleaseAll or a derived
-    // Release), the next GetInstance must not see it.
-    TClass* self = static_cast<TClass*>(this);
+    // Release), the next GetInstance must not see it. The instance is kept
+    // as this base so that no cast to TClass is needed here, where the
+    // TClass part has already been destroyed.
+    CKRSingletonT* self = this;
     m_pInstance.compare_exchange_strong(self, nullptr, std::memory_order_acq_rel);
   }
 
 private:
-  static inline std::atomic<TClass*> m_pInstance{nullptr};
+  static inline std::atomic<CKRSingletonT*> m_pInstance{nullptr};
 };
