@@ -14,7 +14,8 @@ mode=${1:-test}
 root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 
 # Everything the build, the tests and the benchmarks need.
-packages=(g++ cmake ninja-build pkg-config uuid-dev libgtest-dev libgmock-dev libbenchmark-dev)
+packages=(g++ cmake ninja-build pkg-config uuid-dev libgtest-dev libgmock-dev libbenchmark-dev
+  libeigen3-dev libudunits2-dev)
 
 missing=()
 for package in "${packages[@]}"; do

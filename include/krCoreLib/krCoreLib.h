@@ -20,3 +20,9 @@
 #include <krCoreLib/objectmodel/IKRObject.h>
 #include <krCoreLib/objectmodel/IKRObjectType.h>
 #include <krCoreLib/objectmodel/KRObjectTypeMacros.h>
+
+// Units and engineering values.
+
+// Math.
+
+// System services.

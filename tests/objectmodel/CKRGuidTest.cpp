@@ -1,5 +1,7 @@
 #include <krCoreLib/objectmodel/CKRGuid.h>
 
+#include "KRTestSeed.h"
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -16,19 +18,8 @@ namespace {
 
 constexpr CKRGuid kSample = CKRGuid::Literal("{2B7E1516-28AE-42D2-A6AB-F7158809CF4F}");
 
-// Seed for the random sweeps: logged, and settable with KR_TEST_SEED.
-unsigned TestSeed() {
-  static const unsigned seed = [] {
-    const char* text = std::getenv("KR_TEST_SEED");
-    const unsigned value = text != nullptr ? unsigned(std::strtoul(text, nullptr, 10)) : std::random_device()();
-    std::printf("CKRGuid tests: KR_TEST_SEED=%u\n", value);
-    return value;
-  }();
-  return seed;
-}
-
 std::vector<CKRGuid> RandomGuids(std::size_t count) {
-  std::mt19937_64 random(TestSeed());
+  std::mt19937_64 random(KRTestSeed());
   std::vector<CKRGuid> guids;
   for (std::size_t i = 0; i < count; ++i) {
     GUID raw;
