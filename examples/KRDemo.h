@@ -17,3 +17,4 @@ inline void PrintSection(const wchar_t* title) {
 }
 
 void KRDemoObjectModel();
+void KRDemoUnits();

@@ -6,6 +6,8 @@ int main() {
   Print(L"krCoreLib demo\n");
   PrintSection(L"Object model");
   KRDemoObjectModel();
+  PrintSection(L"Units and engineering values");
+  KRDemoUnits();
 
   // Shutdown: the type system, then the process-wide singletons.
   CKRTypeSystem::Release();

@@ -15,7 +15,7 @@ root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 
 # Everything the build, the tests and the benchmarks need.
 packages=(g++ cmake ninja-build pkg-config uuid-dev libgtest-dev libgmock-dev libbenchmark-dev
-  libeigen3-dev libudunits2-dev)
+  libeigen3-dev libudunits2-dev locales)
 
 missing=()
 for package in "${packages[@]}"; do
@@ -26,6 +26,13 @@ if ((${#missing[@]})); then
   export DEBIAN_FRONTEND=noninteractive
   apt-get update -qq
   apt-get install -y -qq --no-install-recommends "${missing[@]}"
+fi
+
+# A German locale (decimal comma) lets the tests show that text forms do not
+# depend on the process locale.
+if ! locale -a 2>/dev/null | grep -qix 'de_DE.utf8'; then
+  echo "krbuild: generating the de_DE.UTF-8 locale for the tests"
+  localedef -i de_DE -f UTF-8 de_DE.UTF-8
 fi
 
 configure_and_build() {

@@ -22,6 +22,14 @@
 #include <krCoreLib/objectmodel/KRObjectTypeMacros.h>
 
 // Units and engineering values.
+#include <krCoreLib/units/CKRColor.h>
+#include <krCoreLib/units/CKROptionSet.h>
+#include <krCoreLib/units/CKRPrecision.h>
+#include <krCoreLib/units/CKRRangedT.h>
+#include <krCoreLib/units/CKRScientificData.h>
+#include <krCoreLib/units/CKRTokenizer.h>
+#include <krCoreLib/units/KRUnitConversion.h>
+#include <krCoreLib/units/SKRUnitHelper.h>
 
 // Math.
 

@@ -1,12 +1,15 @@
 #include <krCoreLib/core/CKRString.h>
 
+#include "KRLocale.h"
 #include "KRUtf8.h"
 
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 #include <cwchar>
+#include <climits>
 #include <cwctype>
+#include <wctype.h>
 
 namespace {
 
@@ -230,7 +233,7 @@ int CKRString::Replace(const wchar_t* from, const wchar_t* to) {
 }
 
 CKRString& CKRString::Trim() {
-  auto blank = [](wchar_t c) { return std::iswspace(static_cast<wint_t>(c)) != 0; };
+  auto blank = [](wchar_t c) { return IsSpace(c); };
   const auto first = std::find_if_not(m_Text.begin(), m_Text.end(), blank);
   const auto last = std::find_if_not(m_Text.rbegin(), std::make_reverse_iterator(first), blank).base();
   m_Text.assign(first, last);
@@ -293,4 +296,44 @@ void CKRString::FormatV(const wchar_t* format, std::va_list arguments) {
     m_Text.assign(streamed, size);
     std::free(streamed);
   }
+}
+
+void CKRString::FormatInvariantV(const wchar_t* format, std::va_list arguments) {
+  // uselocale switches the calling thread only, so other threads keep
+  // formatting in theirs.
+  const locale_t previous = uselocale(SKRLocale::Get());
+  FormatV(format, arguments);
+  uselocale(previous);
+}
+
+CKRString CKRString::FormattedInvariant(const wchar_t* format, ...) {
+  CKRString result;
+  std::va_list arguments;
+  va_start(arguments, format);
+  result.FormatInvariantV(format, arguments);
+  va_end(arguments);
+  return result;
+}
+
+double CKRString::ToDouble(const wchar_t* text) noexcept {
+  return text != nullptr ? wcstod_l(text, nullptr, SKRLocale::Get()) : 0.0;
+}
+
+int CKRString::ToInt(const wchar_t* text) noexcept {
+  if (text == nullptr)
+    return 0;
+  const long long value = wcstoll_l(text, nullptr, 10, SKRLocale::Get());
+  return int(std::clamp<long long>(value, INT_MIN, INT_MAX));
+}
+
+bool CKRString::IsAlpha(wchar_t character) noexcept {
+  return iswalpha_l(static_cast<wint_t>(character), SKRLocale::Get()) != 0;
+}
+
+bool CKRString::IsAlnum(wchar_t character) noexcept {
+  return iswalnum_l(static_cast<wint_t>(character), SKRLocale::Get()) != 0;
+}
+
+bool CKRString::IsSpace(wchar_t character) noexcept {
+  return iswspace_l(static_cast<wint_t>(character), SKRLocale::Get()) != 0;
 }

@@ -94,6 +94,24 @@ public:
   void AppendFormat(const wchar_t* format, ...);
   static CKRString Formatted(const wchar_t* format, ...);
 
+  // The same, with numbers written as in the "C" locale ("1.5", no
+  // grouping) whatever the process locale: for the text forms that stores
+  // write and read back. Thread-safe.
+  void FormatInvariantV(const wchar_t* format, std::va_list arguments);
+  static CKRString FormattedInvariant(const wchar_t* format, ...);
+
+  // Numbers read as the C library's wtof/wtoi read them, in the "C" locale:
+  // leading white space is skipped, the longest number prefix is read, and
+  // a text without one gives 0. ToInt saturates at the limits of int. A null
+  // pointer gives 0.
+  static double ToDouble(const wchar_t* text) noexcept;
+  static int ToInt(const wchar_t* text) noexcept;
+
+  // Unicode character classes, independent of the process locale.
+  static bool IsAlpha(wchar_t character) noexcept;
+  static bool IsAlnum(wchar_t character) noexcept;
+  static bool IsSpace(wchar_t character) noexcept;
+
 private:
   std::wstring m_Text;
 };

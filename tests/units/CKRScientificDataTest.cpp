@@ -1,0 +1,140 @@
+#include <krCoreLib/units/CKRScientificData.h>
+
+#include "KRGermanLocale.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <thread>
+#include <vector>
+
+namespace {
+
+// Restores the process-wide metric flag at the end of a test.
+class CKRScientificDataTest : public testing::Test {
+protected:
+  void TearDown() override { CKRScientificData::m_UnitHelper.SetMetricDefaults(false); }
+};
+
+}  // namespace
+
+TEST_F(CKRScientificDataTest, DefaultUnitFollowsThePresentation) {
+  CKRScientificData length(0, 2.0);
+  EXPECT_EQ(length.GetUnit(), L"in");
+  EXPECT_EQ(length.GetShortDescription(), L"in");
+  EXPECT_EQ(length.GetLongDescription(), L"inches");
+  CKRScientificData::m_UnitHelper.SetMetricDefaults(true);
+  EXPECT_EQ(length.GetUnit(), L"mm");
+  EXPECT_EQ(CKRScientificData(42, 1.0).GetUnit(), L"");  // no such class
+
+  const CKRScientificData chosen(3.0, L"m/s", L"mph");
+  EXPECT_EQ(chosen.GetUnit(), L"m/s");
+  EXPECT_EQ(chosen.GetUnitClass(), 2);
+  CKRScientificData::m_UnitHelper.SetMetricDefaults(false);
+  EXPECT_EQ(CKRScientificData(3.0, L"m/s", L"mph").GetUnit(), L"mph");
+  EXPECT_EQ(CKRScientificData(1.0, L"pixely").GetUnitClass(), 9);
+  EXPECT_EQ(CKRScientificData(1.0, L"furlong").GetUnitClass(), -1);
+
+  const CKRScientificData ranged(4, 5.0, -1.0, 10.0);
+  EXPECT_EQ(ranged.GetMin(), -1.0);
+  EXPECT_EQ(ranged.GetMax(), 10.0);
+  EXPECT_EQ(ranged.GetUnit(), L"psig");
+}
+
+TEST_F(CKRScientificDataTest, ConversionsBetweenUnits) {
+  CKRScientificData value(25.4, L"mm");
+  EXPECT_DOUBLE_EQ(value.GetAs(L"in"), 1.0);
+  EXPECT_EQ(value.GetAs(L"psi"), 25.4);  // incompatible: unchanged
+  value.SetUnitAndUpdateValue(L"psi");  // another class: nothing changes
+  EXPECT_EQ(value.GetUnit(), L"mm");
+  value.SetUnitAndUpdateValue(L"in");
+  EXPECT_EQ(value.GetUnit(), L"in");
+  EXPECT_DOUBLE_EQ(value.Get(), 1.0);
+  value.SetAs(2.54, L"cm");
+  EXPECT_DOUBLE_EQ(value.GetValue(), 1.0);
+  value.Set(3.0, L"");
+  EXPECT_EQ(value.GetUnit(), L"in");
+  value.Set(3.0, L"ft");
+  EXPECT_EQ(value.GetUnit(), L"ft");
+  value.SetUnit(L"");
+  EXPECT_EQ(value.GetUnit(), L"ft");
+  value.Reset();
+  EXPECT_EQ(value.Get(), 0.0);
+  EXPECT_EQ(value.GetUnit(), L"");  // emptied, not the class default
+}
+
+TEST_F(CKRScientificDataTest, ComparisonsConvertTheOtherValue) {
+  const CKRScientificData millimetres(1000.0, L"mm");
+  const CKRScientificData metre(1.0, L"m");
+  EXPECT_TRUE(millimetres == metre);
+  EXPECT_TRUE(metre == millimetres);
+  EXPECT_FALSE(millimetres < metre);
+  EXPECT_FALSE(metre < millimetres);
+  EXPECT_TRUE(millimetres <= metre && millimetres >= metre);
+  const CKRScientificData foot(1.0, L"ft");
+  EXPECT_TRUE(foot < metre);
+  EXPECT_TRUE(metre > foot);
+  EXPECT_TRUE(foot != metre);
+  // A class-default unit compares in its resolved unit.
+  const CKRScientificData inches(0, 12.0);
+  EXPECT_TRUE(inches < CKRScientificData(1.01, L"ft"));
+  EXPECT_TRUE(inches > CKRScientificData(0.99, L"ft"));
+  EXPECT_EQ(static_cast<float>(CKRScientificData(0, 0.1)), 0.1f);
+  EXPECT_TRUE(std::isinf(static_cast<float>(CKRScientificData(0, 1e300))));
+}
+
+TEST_F(CKRScientificDataTest, TextFormRoundTrips) {
+  CKRScientificData value;
+  value.FromString(L"1,2,3,4,mm");
+  EXPECT_EQ(value.ToString(), L"1.000000e+00,2.000000e+00,3.000000e+00,4,mm");
+  EXPECT_EQ(CKRScientificData().ToString(), L"-1.797693e+308,1.797693e+308,0.000000e+00,0,#");
+
+  value.FromString(L"  5,,7  ");  // an empty field leaves its value; the unit is emptied
+  EXPECT_EQ(value.GetMin(), 5.0);
+  EXPECT_EQ(value.GetMax(), 2.0);
+  EXPECT_EQ(value.Get(), 7.0);
+  EXPECT_EQ(value.GetUnitClass(), 4);
+  EXPECT_EQ(value.GetUnit(), L"");
+
+  value.FromString(L"a,1e3x,-2.5e-3,11,h,extra,fields");
+  EXPECT_EQ(value.GetMin(), 0.0);  // no number: 0
+  EXPECT_EQ(value.GetMax(), 1000.0);
+  EXPECT_EQ(value.Get(), -0.0025);
+  EXPECT_EQ(value.GetUnitClass(), 11);
+  EXPECT_EQ(value.GetUnit(), L"h");
+
+  value.FromString(L"");
+  EXPECT_EQ(value.Get(), -0.0025);
+  EXPECT_EQ(value.GetUnit(), L"");
+}
+
+TEST_F(CKRScientificDataTest, TextFormIgnoresTheProcessLocale) {
+  CKRGermanLocale german;
+  if (!german.IsAvailable())
+    GTEST_SKIP() << "no de_DE.UTF-8 locale on this machine";
+  ASSERT_EQ(CKRString::Formatted(L"%.1f", 1.5), L"1,5");  // the locale is in force
+  CKRScientificData value(1, 1.5, -0.25, 2.5);
+  const CKRString text = value.ToString();
+  EXPECT_EQ(text, L"-2.500000e-01,2.500000e+00,1.500000e+00,1,#");
+  CKRScientificData back;
+  back.FromString(text);
+  EXPECT_EQ(back.Get(), 1.5);
+  EXPECT_EQ(back.GetMin(), -0.25);
+}
+
+TEST_F(CKRScientificDataTest, TextFormsFromSeveralThreadsAtOnce) {
+  std::vector<std::thread> threads;
+  std::vector<int> failures(4, 0);
+  for (int t = 0; t < 4; ++t)
+    threads.emplace_back([t, &failures] {
+      for (int i = 0; i < 2000; ++i) {
+        CKRScientificData value;
+        value.FromString(CKRString::Formatted(L"%d,%d,%d,%d,mm", -i, i + t, i * t, t));
+        if (value.Get() != double(i * t) || value.GetUnitClass() != t || value.GetUnit() != L"mm")
+          ++failures[std::size_t(t)];
+      }
+    });
+  for (std::thread& thread : threads)
+    thread.join();
+  EXPECT_EQ(failures, std::vector<int>(4, 0));
+}
