@@ -18,3 +18,4 @@ inline void PrintSection(const wchar_t* title) {
 
 void KRDemoObjectModel();
 void KRDemoUnits();
+void KRDemoMath();

@@ -8,6 +8,8 @@ int main() {
   KRDemoObjectModel();
   PrintSection(L"Units and engineering values");
   KRDemoUnits();
+  PrintSection(L"Math in two precisions");
+  KRDemoMath();
 
   // Shutdown: the type system, then the process-wide singletons.
   CKRTypeSystem::Release();

@@ -32,5 +32,14 @@
 #include <krCoreLib/units/SKRUnitHelper.h>
 
 // Math.
+#include <krCoreLib/math/CKRMathT.h>
+#include <krCoreLib/math/CKRPoint2T.h>
+#include <krCoreLib/math/CKRPoint3T.h>
+#include <krCoreLib/math/CKRPoint4T.h>
+#include <krCoreLib/math/CKRPointT.h>
+#include <krCoreLib/math/CKRVector2T.h>
+#include <krCoreLib/math/CKRVector3T.h>
+#include <krCoreLib/math/CKRVector4T.h>
+#include <krCoreLib/math/CKRVectorT.h>
 
 // System services.

@@ -2,6 +2,7 @@
 
 #include <krCoreLib/units/KRUnitConversion.h>
 
+#include "core/KRNumbers.h"
 #include "units/KRUnitsText.h"
 
 // Constructed while the library loads, before any host code can run; the
@@ -104,5 +105,5 @@ void CKRScientificData::FromString(const CKRString& text) {
 }
 
 CKRScientificData::operator float() const {
-  return SKRUnitsText::ToFloat(m_Value);
+  return SKRNumbers::ToFloat(m_Value);
 }

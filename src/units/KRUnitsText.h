@@ -4,7 +4,6 @@
 #include <krCoreLib/core/CKRString.h>
 #include <krCoreLib/units/CKRTokenizer.h>
 
-#include <limits>
 #include <vector>
 
 struct SKRUnitsText {
@@ -18,17 +17,5 @@ struct SKRUnitsText {
     for (CKRString field; tokenizer.Next(field);)
       fields.push_back(field);
     return fields;
-  }
-
-  // Rounds to single precision; values beyond its range become infinities
-  // (as the hardware rounds them) instead of the undefined behaviour of a
-  // plain conversion. NaN stays NaN.
-  static float ToFloat(double value) {
-    constexpr double kMax = std::numeric_limits<float>::max();
-    if (value > kMax)
-      return std::numeric_limits<float>::infinity();
-    if (value < -kMax)
-      return -std::numeric_limits<float>::infinity();
-    return static_cast<float>(value);
   }
 };

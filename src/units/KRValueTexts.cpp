@@ -51,7 +51,7 @@ void CKRRangedT<T>::FromString(const CKRString& text) {
     if constexpr (std::is_same_v<T, int>)
       value = CKRString::ToInt(fields[i].GetString());
     else
-      value = SKRUnitsText::ToFloat(CKRString::ToDouble(fields[i].GetString()));
+      value = CKRString::ToDouble(fields[i].GetString());
     (i == 0 ? m_Min : i == 1 ? m_Max : m_Value) = value;
   }
 }

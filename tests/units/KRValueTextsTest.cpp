@@ -91,22 +91,24 @@ TEST(CKRRangedT, IntegerTextForm) {
   EXPECT_EQ(ranged, CKRRangedT<int>(5, 3, -3));
 }
 
-TEST(CKRRangedT, DoubleTextFormRoundsFieldsToSinglePrecision) {
+TEST(CKRRangedT, DoubleTextFormKeepsDoublePrecision) {
   CKRRangedT<double> ranged;
   ranged.FromString(L"0.1,1,2");
-  EXPECT_EQ(ranged.GetMin(), double(0.1f));
+  EXPECT_EQ(ranged.GetMin(), 0.1);  // not rounded to 0.1f: a stored range reads back as written
   EXPECT_EQ(ranged.GetMax(), 1.0);
   EXPECT_EQ(ranged.GetValue(), 2.0);
   EXPECT_EQ(ranged.ToString(), L"0.100000,1.000000,2.000000");
 
+  // The default range survives its own text form.
   CKRRangedT<double> defaults;
   defaults.FromString(defaults.ToString());
-  EXPECT_EQ(defaults.GetMin(), -std::numeric_limits<float>::infinity());  // beyond single precision
-  EXPECT_EQ(defaults.GetValue(), 0.0);
+  EXPECT_EQ(defaults, CKRRangedT<double>());
+  ranged.FromString(L"5000000.123456,0,0");
+  EXPECT_EQ(ranged.GetMin(), 5000000.123456);
   ranged.FromString(L"nan,inf,-1e-50");
   EXPECT_TRUE(std::isnan(ranged.GetMin()));
   EXPECT_TRUE(std::isinf(ranged.GetMax()));
-  EXPECT_EQ(ranged.GetValue(), 0.0);
+  EXPECT_EQ(ranged.GetValue(), -1e-50);
 
   CKRGermanLocale german;
   ranged.Set(-1.5, 0.25, 3.0);

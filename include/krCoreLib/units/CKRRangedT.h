@@ -33,7 +33,7 @@ public:
   // Reads "min,max,value" trimmed of blanks: field 0 the minimum, field 1
   // the maximum, field 2 and every later field the value (the last wins).
   // Missing and empty fields leave their values; a field without a number
-  // reads as 0; double fields are rounded to single precision.
+  // reads as 0; double fields keep double precision.
   void FromString(const CKRString& text);
 
   bool operator==(const CKRRangedT& other) const {
