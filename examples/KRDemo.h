@@ -19,3 +19,5 @@ inline void PrintSection(const wchar_t* title) {
 void KRDemoObjectModel();
 void KRDemoUnits();
 void KRDemoMath();
+void KRDemoFiles();
+void KRDemoThreads();

@@ -10,6 +10,10 @@ int main() {
   KRDemoUnits();
   PrintSection(L"Math in two precisions");
   KRDemoMath();
+  PrintSection(L"Paths, files and mapped memory");
+  KRDemoFiles();
+  PrintSection(L"Threads and locks");
+  KRDemoThreads();
 
   // Shutdown: the type system, then the process-wide singletons.
   CKRTypeSystem::Release();

@@ -43,3 +43,10 @@
 #include <krCoreLib/math/CKRVectorT.h>
 
 // System services.
+#include <krCoreLib/system/CKRMemMapFile.h>
+#include <krCoreLib/system/CKRPathHelper.h>
+#include <krCoreLib/system/CKRSingleAppInstance.h>
+#include <krCoreLib/system/CKRSystem.h>
+#include <krCoreLib/system/CKRProgressTaskThread.h>
+#include <krCoreLib/system/CKRReaderWriterLock.h>
+#include <krCoreLib/system/CKRThread.h>
