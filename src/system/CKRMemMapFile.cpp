@@ -93,32 +93,14 @@ int CKRMemMapFile::MapDescriptor(int fileDescriptor, std::uint64_t fileSize) {
 }
 
 int CKRMemMapFile::MapMemory(const wchar_t* name, std::uint32_t size, bool readOnly) {
-  UnMap();
-  if (name == nullptr || *name == L'\0' || size == 0)
-    return 0;
-  try {
-    m_Name = MakeMappingName(name);
-    m_bReadOnly = readOnly;
-    SKRMemoryView view;
-    if (!SKRSharedMemory::Attach(ObjectName(m_Name, L""), size, true, readOnly, nullptr, m_hMapping, view)) {
-      UnMap();
-      return 0;
-    }
-    m_pView = view.m_pAddress;
-    m_ViewLength = view.m_Length;
-    m_dwSize = size;
-    if (!CreateMutex()) {
-      UnMap();
-      return 0;
-    }
-    return 1;
-  } catch (...) {
-    UnMap();
-    return 0;
-  }
+  return AttachMemory(name, size, true, readOnly);
 }
 
 int CKRMemMapFile::MapExistingMemory(const wchar_t* name, std::uint32_t size, bool readOnly) {
+  return AttachMemory(name, size, false, readOnly);
+}
+
+int CKRMemMapFile::AttachMemory(const wchar_t* name, std::uint32_t size, bool create, bool readOnly) {
   UnMap();
   if (name == nullptr || *name == L'\0' || size == 0)
     return 0;
@@ -126,7 +108,7 @@ int CKRMemMapFile::MapExistingMemory(const wchar_t* name, std::uint32_t size, bo
     m_Name = MakeMappingName(name);
     m_bReadOnly = readOnly;
     SKRMemoryView view;
-    if (!SKRSharedMemory::Attach(ObjectName(m_Name, L""), size, false, readOnly, nullptr, m_hMapping, view)) {
+    if (!SKRSharedMemory::Attach(ObjectName(m_Name, L""), size, create, readOnly, nullptr, m_hMapping, view)) {
       UnMap();
       return 0;
     }

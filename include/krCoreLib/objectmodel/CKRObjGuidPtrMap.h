@@ -69,7 +69,7 @@ public:
   // 0 for null, for an element that is not a T and when an element is
   // already stored under the element's instance ID.
   int Add(IKRObject* element) override {
-    T* typed = Cast(element);
+    T* typed = CastElement<T>(element);
     if (typed == nullptr)
       return 0;
     return m_Map.try_emplace(element->GetInstanceID(), typed).second ? 1 : 0;
@@ -96,13 +96,6 @@ public:
   typename Map::const_iterator end() const { return m_Map.end(); }
 
 private:
-  static T* Cast(IKRObject* element) {
-    if constexpr (std::is_same_v<T, IKRObject>)
-      return element;
-    else
-      return dynamic_cast<T*>(element);
-  }
-
   Map m_Map;
 };
 

@@ -95,7 +95,7 @@ public:
 
   // 0 for null, for an element that is not a T and for one already listed.
   int Add(IKRObject* element) override {
-    T* typed = Cast(element);
+    T* typed = CastElement<T>(element);
     if (typed == nullptr || Contains(typed))
       return 0;
     m_List.push_back(typed);
@@ -129,13 +129,6 @@ public:
   typename List::const_iterator end() const { return m_List.end(); }
 
 private:
-  static T* Cast(IKRObject* element) {
-    if constexpr (std::is_same_v<T, IKRObject>)
-      return element;
-    else
-      return dynamic_cast<T*>(element);
-  }
-
   List m_List;
 };
 

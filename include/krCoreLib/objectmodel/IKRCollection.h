@@ -8,6 +8,8 @@
 
 #include <krCoreLib/objectmodel/IKRObject.h>
 
+#include <type_traits>
+
 class KRCORELIB_API IKRReadOnlyCollection {
 public:
   virtual int GetCount() const = 0;
@@ -30,6 +32,16 @@ public:
 
 protected:
   ~IKRCollection() = default;
+
+  // `element` as the collection's element class T, or null when it is not
+  // one (the views take any object; a collection holds only its class).
+  template <class T>
+  static T* CastElement(IKRObject* element) {
+    if constexpr (std::is_same_v<T, IKRObject>)
+      return element;
+    else
+      return dynamic_cast<T*>(element);
+  }
 };
 
 // A forward walk over a collection: call Next(1) once, then Next(0) until it

@@ -84,6 +84,8 @@ public:
 
 private:
   int MapDescriptor(int fileDescriptor, std::uint64_t fileSize);
+  // Maps named memory, creating it when `create` is set.
+  int AttachMemory(const wchar_t* name, std::uint32_t size, bool create, bool readOnly);
   bool CreateMutex();
 
   int m_hFile = -1;             // the mapped file; -1 for shared memory
