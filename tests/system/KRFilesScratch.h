@@ -1,17 +1,32 @@
 // Helpers of the file, path and shared-memory tests: a scratch folder that
-// is unique to the test process and removed with everything in it, and a
-// few direct system calls to prepare what the library must cope with.
+// is unique to the test process and removed with everything in it, and
+// direct system calls to prepare what the library must cope with.
 #pragma once
 
 #include <krCoreLib/core/CKRString.h>
+#include <krCoreLib/system/CKRSystem.h>
+
+#include "KRTestSeed.h"
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <array>
 #include <cerrno>
+#include <cmath>
+#include <cstdio>
+#include <cstdint>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
+#include <fstream>
+#include <optional>
+#include <random>
 #include <string>
 #include <system_error>
+#include <thread>
+#include <tuple>
+#include <vector>
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -23,12 +38,14 @@ class CKRFilesScratch {
 public:
   CKRFilesScratch() {
     std::string pattern = (std::filesystem::temp_directory_path() / "krfiles-XXXXXX").string();
-    if (::mkdtemp(pattern.data()) != nullptr)
-      m_Root = pattern;
+    if (::mkdtemp(pattern.data()) == nullptr) {
+      std::perror("no scratch folder");
+      std::abort();
+    }
+    m_Root = pattern;
   }
   ~CKRFilesScratch() {
-    std::error_code error;
-    // Give back permissions the tests took away, so that everything goes.
+    std::error_code error;   // give back permissions taken away, so that everything goes
     for (auto it = std::filesystem::recursive_directory_iterator(m_Root, error);
          !error && it != std::filesystem::recursive_directory_iterator(); it.increment(error)) {
       if (it->is_directory(error) && !it->is_symlink(error))
@@ -36,13 +53,8 @@ public:
     }
     std::filesystem::remove_all(m_Root, error);
   }
-  CKRFilesScratch(const CKRFilesScratch&) = delete;
-  CKRFilesScratch& operator=(const CKRFilesScratch&) = delete;
-
-  bool IsValid() const { return !m_Root.empty(); }
-  // The native path of a name inside the folder ("" for the folder itself).
+  // The path of a name inside the folder ("" for the folder itself).
   std::string Native(const std::string& name = "") const { return name.empty() ? m_Root : m_Root + "/" + name; }
-  // The same as a wide path.
   CKRString Wide(const std::string& name = "") const { return CKRString::FromUtf8(Native(name)); }
 
   void WriteFile(const std::string& name, const std::string& content) const {
@@ -56,13 +68,45 @@ public:
     ASSERT_EQ(::symlink(target.c_str(), Native(name).c_str()), 0) << name;
   }
   void MakePipe(const std::string& name) const { ASSERT_EQ(::mkfifo(Native(name).c_str(), 0600), 0) << name; }
+  // A sparse file of `size` bytes.
+  void MakeSparse(const std::string& name, off_t size) const {
+    const int fd = ::open(Native(name).c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0644);
+    ASSERT_GE(fd, 0);
+    ASSERT_EQ(::ftruncate(fd, size), 0);
+    ::close(fd);
+  }
 
 private:
   std::string m_Root;
 };
 
-// Number of open descriptors of this process: a failure must leave it as
-// it was.
+// Paths every file service must refuse, made inside `scratch`.
+inline std::vector<std::pair<const char*, CKRString>> KRBadPaths(const CKRFilesScratch& scratch) {
+  scratch.MakeFolder("bad-folder");
+  scratch.MakePipe("bad-pipe");
+  scratch.MakeLink(scratch.Native("bad-gone"), "bad-dangling");
+  const wchar_t invalid[] = {L'/', L't', L'm', L'p', L'/', wchar_t(0xD800), L'\0'};
+  return {{"empty", CKRString()},
+          {"overlong", scratch.Wide() + L"/" + CKRString(5000, L'a')},
+          {"lone surrogate", CKRString(invalid)},
+          {"missing folder", scratch.Wide("no/such/file")},
+          {"directory", scratch.Wide("bad-folder")},
+          {"pipe without a writer", scratch.Wide("bad-pipe")},
+          {"dangling link", scratch.Wide("bad-dangling")}};
+}
+
+// A file's content through CKRSystem::Load.
+inline std::string KRLoadText(const CKRString& path) {
+  unsigned char* buffer = nullptr;
+  std::size_t size = 0;
+  if (!CKRSystem::Load(path.GetString(), buffer, size))
+    return "<unreadable>";
+  std::string text(reinterpret_cast<char*>(buffer), size);
+  delete[] buffer;
+  return text;
+}
+
+// Number of open descriptors of this process.
 inline int KROpenDescriptorCount() {
   int count = 0;
   if (DIR* dir = ::opendir("/proc/self/fd")) {
@@ -73,8 +117,7 @@ inline int KROpenDescriptorCount() {
   return count;
 }
 
-// Starts `body` in a forked child, which ends with _exit(body()), running
-// no destructors of the parent's objects. Returns the child's ID, or -1.
+// Starts `body` in a forked child that ends with _exit(body()); -1 on failure.
 template <typename Body>
 pid_t KRStartChild(Body body) {
   const pid_t child = ::fork();
@@ -85,14 +128,10 @@ pid_t KRStartChild(Body body) {
 
 // Waits for a child: its exit status, or -1 when it did not exit normally.
 inline int KRWaitChild(pid_t child) {
-  if (child < 0)
-    return -1;
-  int status = 0;
-  while (::waitpid(child, &status, 0) < 0) {
-    if (errno != EINTR)
-      return -1;
+  int status = -1;
+  while (child > 0 && ::waitpid(child, &status, 0) < 0 && errno == EINTR) {
   }
-  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  return child > 0 && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
 // Runs `body` in a forked child and returns its exit status.
@@ -101,9 +140,8 @@ int KRRunInChild(Body body) {
   return KRWaitChild(KRStartChild(body));
 }
 
-// Runs one (usually disabled) test of `program`, a copy of this test
-// program, in a fresh process and returns its exit status: 0 when it
-// passed. Its output goes nowhere.
+// Runs one (usually disabled) test of `program`, a copy of this program, in
+// a fresh process: 0 when it passed.
 inline int KRRunTestProgram(const std::string& program, const char* test) {
   const std::string filter = std::string("--gtest_filter=") + test;
   return KRRunInChild([&] {

@@ -1,15 +1,17 @@
 // What the thread and lock tests share: bounded waits on conditions, gates,
 // helper threads that run steps on request, and a recorder of debug output.
-//
-// Nothing here sleeps for an outcome: every wait is for a condition and has
-// a generous limit that fails the test instead of hanging it.
+// Every wait is for a condition, with a limit that fails the test instead
+// of hanging it.
 #pragma once
 
 #include <krCoreLib/core/CKRDebugOutput.h>
 #include <krCoreLib/system/CKRThread.h>
 
+#include "KRTestSeed.h"
+
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <condition_variable>
@@ -17,8 +19,11 @@
 #include <cstdlib>
 #include <deque>
 #include <functional>
+#include <latch>
 #include <memory>
 #include <mutex>
+#include <numeric>
+#include <random>
 #include <string>
 #include <thread>
 #include <vector>
@@ -30,46 +35,40 @@ inline constexpr std::chrono::seconds kGenerous{20};
 // The same limit in CKRThread's 100-ms steps.
 inline constexpr unsigned long kGenerousSteps = 200;
 
-// Polls `condition` until it holds; false when `limit` passed first. Used
-// for states that are visible only through polling (a lock's counts).
+// Polls `condition` (for states visible only by polling, such as a lock's
+// counts); false when the limit passed first.
 template <class TCondition>
-bool WaitUntil(TCondition condition, std::chrono::milliseconds limit = kGenerous) {
-  const auto end = std::chrono::steady_clock::now() + limit;
+bool WaitUntil(TCondition condition) {
+  const auto end = std::chrono::steady_clock::now() + kGenerous;
   for (int round = 0; !condition(); ++round) {
     if (std::chrono::steady_clock::now() > end)
       return condition();
     if (round < 64)
       std::this_thread::yield();
     else
-      std::this_thread::sleep_for(std::chrono::microseconds(100));   // a polling interval, not a wait for an outcome
+      std::this_thread::sleep_for(std::chrono::microseconds(100));   // a polling interval
   }
   return true;
 }
 
-// A one-way gate: closed until Open; Wait returns true once it is open.
+// A one-way gate: closed until Open.
 class CGate {
 public:
-  // Notifies under the lock: a waiter may destroy the gate as soon as it
-  // returns.
+  // Notifies under the lock: a waiter may destroy the gate once it returns.
   void Open() {
     std::lock_guard<std::mutex> lock(m_Mutex);
     m_Open = true;
     m_Signal.notify_all();
   }
-  bool Wait(std::chrono::milliseconds limit = kGenerous) {
+  bool Wait() {
     std::unique_lock<std::mutex> lock(m_Mutex);
-    return m_Signal.wait_for(lock, limit, [this] { return m_Open; });
+    return m_Signal.wait_for(lock, kGenerous, [this] { return m_Open; });
   }
-  // Only for a thread that the test kills while it waits here. (Without a
-  // time limit: a thread killed inside a timed wait trips a false report of
-  // the address sanitizer of this compiler while the stack unwinds.)
+  // For a thread killed while it waits: a thread killed inside a timed wait
+  // trips a false report of this compiler's address sanitizer.
   void WaitToBeKilled() {
     std::unique_lock<std::mutex> lock(m_Mutex);
     m_Signal.wait(lock, [this] { return m_Open; });
-  }
-  bool IsOpen() {
-    std::lock_guard<std::mutex> lock(m_Mutex);
-    return m_Open;
   }
 
 private:
@@ -78,64 +77,50 @@ private:
   bool m_Open = false;
 };
 
-// A helper thread that runs steps posted by the test, one after the other,
-// so that the test decides which thread holds what. A step that never ends
-// (a deadlock) fails the test; the process is then ended because the stuck
-// thread cannot be joined.
+// A helper thread that runs the test's steps in order, so that the test
+// decides which thread holds what. A step that never ends fails the test
+// and ends the process, since the stuck thread cannot be joined.
 class CActor {
 public:
   CActor() : m_Thread([this] { Loop(); }) {}
-  CActor(const CActor&) = delete;
-  CActor& operator=(const CActor&) = delete;
   ~CActor() {
-    Post(nullptr);
-    if (!m_Idle.Wait()) {
+    if (!Do(nullptr)) {
       std::fputs("CActor: a step did not end; the test cannot continue\n", stderr);
       std::abort();
     }
     m_Thread.join();
   }
-
   // Queues `step` and returns a gate that opens when it has run.
   std::shared_ptr<CGate> Post(std::function<void()> step) {
     auto done = std::make_shared<CGate>();
     {
       std::lock_guard<std::mutex> lock(m_Mutex);
-      m_Steps.push_back({std::move(step), done});
+      m_Steps.emplace_back(std::move(step), done);
     }
     m_Signal.notify_one();
     return done;
   }
-  // Runs `step` and waits for it; false when it did not end in time.
   bool Do(std::function<void()> step) { return Post(std::move(step))->Wait(); }
 
 private:
-  struct SStep {
-    std::function<void()> m_Run;
-    std::shared_ptr<CGate> m_Done;
-  };
   void Loop() {
-    for (;;) {
-      SStep step;
+    for (bool more = true; more;) {
+      std::pair<std::function<void()>, std::shared_ptr<CGate>> step;
       {
         std::unique_lock<std::mutex> lock(m_Mutex);
         m_Signal.wait(lock, [this] { return !m_Steps.empty(); });
         step = std::move(m_Steps.front());
         m_Steps.pop_front();
       }
-      if (!step.m_Run) {
-        m_Idle.Open();
-        return;
-      }
-      step.m_Run();
-      step.m_Done->Open();
+      more = static_cast<bool>(step.first);
+      if (more)
+        step.first();
+      step.second->Open();
     }
   }
-
   std::mutex m_Mutex;
   std::condition_variable m_Signal;
-  std::deque<SStep> m_Steps;
-  CGate m_Idle;
+  std::deque<std::pair<std::function<void()>, std::shared_ptr<CGate>>> m_Steps;
   std::thread m_Thread;
 };
 
@@ -144,9 +129,6 @@ class CDebugRecorder {
 public:
   CDebugRecorder() : m_Previous(CKRDebugOutput::SetHandler(&Record, this)) {}
   ~CDebugRecorder() { CKRDebugOutput::SetHandler(m_Previous); }
-  CDebugRecorder(const CDebugRecorder&) = delete;
-  CDebugRecorder& operator=(const CDebugRecorder&) = delete;
-
   std::vector<std::wstring> Texts() {
     std::lock_guard<std::mutex> lock(m_Mutex);
     return m_Texts;
@@ -158,18 +140,16 @@ private:
     std::lock_guard<std::mutex> lock(self->m_Mutex);
     self->m_Texts.emplace_back(text);
   }
-
   CKRDebugOutput::Handler m_Previous;
   std::mutex m_Mutex;
   std::vector<std::wstring> m_Texts;
 };
 
-// A thread object whose handler is given by the test, with the protected
-// operations a handler uses made reachable.
+// A thread whose handler the test gives, with the protected operations a
+// handler uses made reachable.
 class CFunctionThread : public CKRThread {
 public:
   using Body = std::function<unsigned long(CFunctionThread&)>;
-
   explicit CFunctionThread(Body body, int usesNotification = 1) : m_Body(std::move(body)) {
     SetUsesNotification(usesNotification);
   }
@@ -178,7 +158,6 @@ public:
     if (IsAlive() && !IsCurrentThread())
       Kill(0xFFFFFFFF, 0);
   }
-
   using CKRThread::HandleCommandImmediately;
   using CKRThread::Lock;
   using CKRThread::SetActivityStatus;
@@ -194,5 +173,21 @@ protected:
 private:
   Body m_Body;
 };
+
+// Stops `thread`, waiting long enough: its exit code, or kNotStopped.
+inline constexpr unsigned long kNotStopped = 0xDEADu;
+inline unsigned long Stopped(CKRThread& thread) {
+  unsigned long exitCode = 0;
+  return thread.Stop(exitCode, kGenerousSteps) == 1 ? exitCode : kNotStopped;
+}
+
+// Runs until "stop" arrives, then ends with `exitCode`.
+inline CFunctionThread::Body UntilStop(unsigned long exitCode) {
+  return [exitCode](CFunctionThread& self) -> unsigned long {
+    for (int command = KRTHREAD_CMD_NONE; command != KRTHREAD_CMD_STOP;)
+      self.WaitForNotification(command, KRTHREAD_INFINITE);
+    return exitCode;
+  };
+}
 
 }  // namespace krtest

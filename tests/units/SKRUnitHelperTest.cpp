@@ -4,6 +4,7 @@
 
 namespace {
 
+// The key of the unit a lookup copied out, or "<none>".
 CKRString UnitOf(bool found, const _SKRUnit& unit) {
   return found ? unit.Unit : CKRString(L"<none>");
 }
@@ -13,43 +14,23 @@ CKRString UnitOf(bool found, const _SKRUnit& unit) {
 TEST(SKRUnitHelper, RegistersTheLibraryUnitClasses) {
   SKRUnitHelper helper;
   const int counts[] = {5, 3, 3, 3, 3, 1, 2, 2, 3, 3, 5, 3};
-  int total = 0;
-  for (int unitClass = 0; unitClass < 12; ++unitClass) {
+  for (int unitClass = 0; unitClass < 12; ++unitClass)
     EXPECT_EQ(helper.GetUnitCount(unitClass), counts[unitClass]) << unitClass;
-    total += helper.GetUnitCount(unitClass);
-  }
-  EXPECT_EQ(total, 36);
   EXPECT_EQ(helper.GetUnitCount(12), 0);
-  EXPECT_EQ(helper.GetUnitCount(-1), 0);
-
   EXPECT_EQ(helper.GetUnitSet(0), L"cm,in,ft,mm,m");
   EXPECT_EQ(helper.GetUnitSet(3), L"\u00b0F,\u00b0C,K");
   EXPECT_EQ(helper.GetUnitSet(99), L"");
-  EXPECT_EQ(helper.GetShortDescription(2, L"mph"), L"MPH");
-  EXPECT_EQ(helper.GetLongDescription(4, L"mmHg"), L"millimeter of Mercury");
   EXPECT_EQ(helper.GetShortDescription(3, L"K"), L"\u00b0K");
+  EXPECT_EQ(helper.GetLongDescription(4, L"mmHg"), L"millimeter of Mercury");
   EXPECT_EQ(helper.GetShortDescription(2, L"MPH"), L"");  // keys, not descriptions
-  EXPECT_EQ(helper.GetLongDescription(99, L"mph"), L"");
-
   _SKRUnit unit;
-  ASSERT_TRUE(helper.GetUnit(8, 2u, unit));
-  EXPECT_EQ(unit.ShortDescription, L"pixel");
-  EXPECT_EQ(unit.Unit, L"pixelx");
-  EXPECT_EQ(unit.LongDescription, L"Pixels");
-  EXPECT_EQ(unit.Defaults, 0);
+  EXPECT_EQ(UnitOf(helper.GetUnit(8, 2u, unit), unit), L"pixelx");
   EXPECT_FALSE(helper.GetUnit(8, 3u, unit));
-  EXPECT_FALSE(helper.GetUnit(8, L"pixely", unit));
-}
-
-TEST(SKRUnitHelper, ClassOfAUnitIsTheLowestHoldingIt) {
-  const SKRUnitHelper helper;
+  // The lowest class holding a key answers.
   EXPECT_EQ(helper.GetUnitClass(L"mm"), 0);
-  EXPECT_EQ(helper.GetUnitClass(L"in"), 0);
   EXPECT_EQ(helper.GetUnitClass(L"pixelx"), 8);
-  EXPECT_EQ(helper.GetUnitClass(L"pixely"), 9);
   EXPECT_EQ(helper.GetUnitClass(L"K"), 3);
   EXPECT_EQ(helper.GetUnitClass(L"MM"), -1);
-  EXPECT_EQ(helper.GetUnitClass(L""), -1);
 }
 
 TEST(SKRUnitHelper, NeighboursWrapAround) {
@@ -57,7 +38,6 @@ TEST(SKRUnitHelper, NeighboursWrapAround) {
   _SKRUnit unit;
   EXPECT_EQ(UnitOf(helper.GetNextUnit(11, L"h", unit, false), unit), L"min");
   EXPECT_EQ(UnitOf(helper.GetNextUnit(11, L"min", unit, true), unit), L"h");
-  EXPECT_EQ(UnitOf(helper.GetNextUnit(11, L"min", unit, false), unit), L"s");
   EXPECT_EQ(UnitOf(helper.GetNextUnit(0, L"cm", unit, true), unit), L"m");
   EXPECT_FALSE(helper.GetNextUnit(5, L"centipoise", unit, false));  // one unit only
   EXPECT_FALSE(helper.GetNextUnit(11, L"d", unit, false));
@@ -67,25 +47,19 @@ TEST(SKRUnitHelper, NeighboursWrapAround) {
 TEST(SKRUnitHelper, DefaultUnitsFollowThePresentation) {
   SKRUnitHelper helper;
   _SKRUnit unit;
-  EXPECT_FALSE(helper.GetMetricDefaults());
   EXPECT_EQ(UnitOf(helper.GetDefaultUnit(0, unit), unit), L"in");
-  EXPECT_EQ(UnitOf(helper.GetDefaultUnit(5, unit), unit), L"centipoise");
   helper.SetMetricDefaults(true);
   EXPECT_EQ(UnitOf(helper.GetDefaultUnit(0, unit), unit), L"mm");
   EXPECT_EQ(UnitOf(helper.GetDefaultUnit(5, unit), unit), L"centipoise");
   EXPECT_EQ(UnitOf(helper.GetDefaultUnit(0, unit, false), unit), L"in");
-  // The text form ignores the flag: the first unit with any default.
-  EXPECT_EQ(helper.GetDefaultUnit(0), L"in");
-  EXPECT_EQ(helper.GetDefaultUnit(99), L"");
-
-  // A class without the asked default falls back to its first unit.
+  EXPECT_EQ(helper.GetDefaultUnit(0), L"in");  // the text form ignores the flag
+  // Without the asked default the first unit answers.
   helper.AddUnit(20, L"a", L"m", L"metres", 0);
   helper.AddUnit(20, L"b", L"ft", L"feet", 1);
   EXPECT_EQ(UnitOf(helper.GetDefaultUnit(20, unit, true), unit), L"m");
   EXPECT_EQ(helper.GetDefaultUnit(20), L"ft");
   helper.ClearUnits(20);
   EXPECT_FALSE(helper.GetDefaultUnit(20, unit, true));
-  EXPECT_FALSE(helper.GetDefaultUnit(99, unit, true));
   EXPECT_EQ(helper.GetDefaultUnit(20), L"");
 }
 
@@ -98,17 +72,13 @@ TEST(SKRUnitHelper, AddUnitReplacesOnlyTheDefaultsOfAKnownKey) {
   EXPECT_EQ(unit.ShortDescription, L"cm");
   EXPECT_EQ(unit.LongDescription, L"centimeters");
   EXPECT_EQ(unit.Defaults, 2);
-
   EXPECT_EQ(helper.AddUnit(0, L"yd", L"yd", L"yards", 0), 6);
   EXPECT_EQ(helper.GetUnitSet(0), L"cm,in,ft,mm,m,yd");  // the cache follows changes
-  EXPECT_EQ(helper.AddUnit(30, L"N", L"N", L"newton", 0), 1);
 
-  SKRUnitHelper copy = helper;
+  const SKRUnitHelper copy = helper;
   helper.ClearUnits(0);
-  EXPECT_EQ(helper.GetUnitCount(0), 0);
   EXPECT_EQ(helper.GetUnitSet(0), L"");
   EXPECT_EQ(helper.GetUnitClass(L"cm"), -1);
   EXPECT_EQ(copy.GetUnitCount(0), 6);  // copies are independent
-  helper.ClearUnits(1234);             // unknown: ignored
   EXPECT_EQ(helper.AddUnit(0, L"m", L"m", L"meters", 2), 1);
 }
