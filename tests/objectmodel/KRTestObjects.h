@@ -8,17 +8,17 @@
 #include <string>
 #include <vector>
 
-// A concrete class made through its static type (the nested-type pattern),
-// with hooks to veto creation and destruction and a count of destructions.
+// A class made through its static type (the nested-type pattern), with vetoes
+// of creation and destruction, a hook for elements that act on their
+// containers, and a count of destructions.
 class CKRTestItem : public CKRObjectImpl {
   KR_DECLARE_OBJECT_TYPE(CKRTestItem, CKRObjectTypeImpl, "{7C0D2E1F-0000-4000-8000-000000000001}")
 
 public:
   static inline int s_Destroyed = 0;
   static inline bool s_RefuseInitialize = false;
-  int m_AllowRelease = 1;
-  int m_Tag = 0;
-  // Called by OnBeforeRelease, for elements that act on their containers.
+  static inline int s_AllowReleaseOfNew = 1;
+  int m_AllowRelease = s_AllowReleaseOfNew;
   std::function<void(CKRTestItem*)> m_OnBeforeRelease;
 
   int OnBeforeRelease() override {
@@ -33,11 +33,8 @@ protected:
   ~CKRTestItem() override { ++s_Destroyed; }
 };
 
-// A class derived from CKRTestItem, and an abstract class.
 class CKRTestDerivedItem : public CKRTestItem {
   KR_DECLARE_OBJECT_TYPE(CKRTestDerivedItem, CKRObjectTypeImpl, "{7C0D2E1F-0000-4000-8000-000000000002}")
-protected:
-  CKRTestDerivedItem() = default;
 };
 
 class CKRTestAbstract : public CKRObjectImpl {
@@ -49,36 +46,43 @@ public:
 // A tracked CKRTestItem made by its type.
 CKRTestItem* NewTestItem(CKRGuid id = CKRGuid());
 
-// Claims the test program's static types into a fresh type system.
-void ClaimTestTypes();
-
-// A type object that is not static: each test makes the hierarchy it needs.
-// Its instances are CKRLocalObject; it logs its InitializeType and Release.
-class CKRLocalType : public CKRObjectTypeImpl {
-public:
-  CKRLocalType(const wchar_t* name, CKRGuid id, CKRGuid parentID = CKRGuid(), bool abstract = false,
-               std::vector<std::wstring>* log = nullptr);
-  void InitializeType() override;
-  void Release() override;
-
-  // Whether the parent was linked when InitializeType ran.
-  bool m_ParentLinkedAtInitialize = false;
-
-protected:
-  IKRObject* CTOR() override;
-  void DTOR(IKRObject* object) override;
-
-private:
-  std::vector<std::wstring>* m_pLog;
-};
-
 class CKRLocalObject : public CKRObjectImpl {
 public:
   explicit CKRLocalObject(IKRObjectType* type) : m_pType(type) {}
-  ~CKRLocalObject() override = default;
   IKRObjectType* GetType() override { return m_pType; }
   int Release() override { return m_pType->ReleaseInstance(this); }
 
 private:
   IKRObjectType* m_pType;
+};
+
+// A type object that is not static: each test makes the hierarchy it needs.
+// It logs its InitializeType and Release.
+class CKRLocalType : public CKRObjectTypeImpl {
+public:
+  CKRLocalType(const wchar_t* name, CKRGuid id, CKRGuid parentID = CKRGuid(), std::vector<std::wstring>* log = nullptr)
+      : m_pLog(log) {
+    SetID(id);
+    SetParentTypeID(parentID);
+    SetName(name);
+    SetClassName(name);
+  }
+  void InitializeType() override {
+    m_ParentLinkedAtInitialize = GetParentType() != nullptr;
+    if (m_pLog != nullptr)
+      m_pLog->push_back(L"init " + GetName().str());
+  }
+  void Release() override {
+    if (m_pLog != nullptr)
+      m_pLog->push_back(L"release " + GetName().str());
+    CKRObjectTypeImpl::Release();
+  }
+  bool m_ParentLinkedAtInitialize = false;
+
+protected:
+  IKRObject* CTOR() override { return new CKRLocalObject(this); }
+  void DTOR(IKRObject* object) override { delete static_cast<CKRLocalObject*>(object); }
+
+private:
+  std::vector<std::wstring>* m_pLog;
 };
