@@ -37,6 +37,7 @@
 #include <krCoreLib/math/CKRPoint3T.h>
 #include <krCoreLib/math/CKRPoint4T.h>
 #include <krCoreLib/math/CKRPointT.h>
+#include <krCoreLib/math/CKRTupleT.h>
 #include <krCoreLib/math/CKRVector2T.h>
 #include <krCoreLib/math/CKRVector3T.h>
 #include <krCoreLib/math/CKRVector4T.h>

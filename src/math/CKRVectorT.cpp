@@ -7,10 +7,6 @@
 #include <krCoreLib/math/CKRVector3T.h>
 #include <krCoreLib/math/CKRVector4T.h>
 
-#include "SKRTupleText.h"
-
-#include <cwchar>
-
 // ---- CKRVector2T ----
 
 // The direction of each vector is found with ACos of its normalised x (and
@@ -99,21 +95,6 @@ void CKRVector3T<Real, Other>::GenerateOrthonormalBasis(CKRVector3T& u, CKRVecto
     u.Set(Real(0), w.Z() * inverse, -w.Y() * inverse);
   }
   v = w.Cross(u);
-}
-
-template <class Real, class Other>
-CKRString CKRVector3T<Real, Other>::ToString() const {
-  return SKRTupleText::Write(this->m_Tuple, 3);
-}
-
-template <class Real, class Other>
-void CKRVector3T<Real, Other>::FromString(const wchar_t* text) {
-  SKRTupleText::Read(this->m_Tuple, 3, text, text != nullptr ? std::wcslen(text) : 0);
-}
-
-template <class Real, class Other>
-void CKRVector3T<Real, Other>::FromString(const CKRString& text) {
-  SKRTupleText::Read(this->m_Tuple, 3, text.GetString(), text.size());
 }
 
 template class CKRVectorT<2, float, double>;

@@ -29,26 +29,20 @@ public:
   constexpr CKRPoint2T(Other x, Other y) noexcept : Base(std::in_place, Real(x), Real(y)) {}
   CKRPoint2T& operator=(const CKRPoint2T& p) noexcept = default;
 
-  void Set(Real x, Real y) noexcept {
-    this->m_Tuple[0] = x;
-    this->m_Tuple[1] = y;
-  }
+  using Base::Set;
   void Set(Other x, Other y) noexcept { Set(Real(x), Real(y)); }
-  Real X() const noexcept { return this->m_Tuple[0]; }
-  Real& X() noexcept { return this->m_Tuple[0]; }
-  Real Y() const noexcept { return this->m_Tuple[1]; }
-  Real& Y() noexcept { return this->m_Tuple[1]; }
-  void SetX(Real x) noexcept { this->m_Tuple[0] = x; }
-  void SetY(Real y) noexcept { this->m_Tuple[1] = y; }
+  using Base::SetX;
+  using Base::SetY;
+  using Base::X;
+  using Base::Y;
 
   // "%f,%f": six decimals, no exponent, independent of the locale.
-  CKRString ToString() const;
+  using Base::ToString;
   // Removes every space, splits at "," and reads up to two numbers in order
   // (C-locale decimal syntax; a piece that is not a number gives 0).
   // Components without a piece keep their values; further pieces are
   // ignored; a null or empty text changes nothing.
-  void FromString(const wchar_t* text);
-  void FromString(const CKRString& text);
+  using Base::FromString;
 };
 
 template <class Real, class Other>

@@ -30,30 +30,22 @@ public:
   constexpr CKRPoint3T(Other x, Other y, Other z) noexcept : Base(std::in_place, Real(x), Real(y), Real(z)) {}
   CKRPoint3T& operator=(const CKRPoint3T& p) noexcept = default;
 
-  void Set(Real x, Real y, Real z) noexcept {
-    this->m_Tuple[0] = x;
-    this->m_Tuple[1] = y;
-    this->m_Tuple[2] = z;
-  }
+  using Base::Set;
   void Set(Other x, Other y, Other z) noexcept { Set(Real(x), Real(y), Real(z)); }
-  Real X() const noexcept { return this->m_Tuple[0]; }
-  Real& X() noexcept { return this->m_Tuple[0]; }
-  Real Y() const noexcept { return this->m_Tuple[1]; }
-  Real& Y() noexcept { return this->m_Tuple[1]; }
-  Real Z() const noexcept { return this->m_Tuple[2]; }
-  Real& Z() noexcept { return this->m_Tuple[2]; }
-  void SetX(Real x) noexcept { this->m_Tuple[0] = x; }
-  void SetY(Real y) noexcept { this->m_Tuple[1] = y; }
-  void SetZ(Real z) noexcept { this->m_Tuple[2] = z; }
+  using Base::SetX;
+  using Base::SetY;
+  using Base::SetZ;
+  using Base::X;
+  using Base::Y;
+  using Base::Z;
 
   // "%f,%f,%f": six decimals, no exponent, independent of the locale.
-  CKRString ToString() const;
+  using Base::ToString;
   // Removes every space, splits at "," and reads up to three numbers in
   // order (C-locale decimal syntax; a piece that is not a number gives 0).
   // Components without a piece keep their values; further pieces are
   // ignored; a null or empty text changes nothing.
-  void FromString(const wchar_t* text);
-  void FromString(const CKRString& text);
+  using Base::FromString;
 };
 
 template <class Real, class Other>

@@ -10,74 +10,30 @@
 // triangulators read directly. Default construction leaves the components
 // uninitialised.
 //
-// Equality compares the stored bits (0.0 and -0.0 differ; two NaNs with the
-// same bits are equal); <, <=, >, >= compare the byte images of the
-// components as unsigned bytes in memory order: a total order for sorted
-// containers, not a numeric one. Indexes are not checked: the caller keeps
-// them in 0..N-1.
+// Raw access, ZERO(), UNIT(), the comparisons (bits and byte images) and
+// Approx_Equal come from CKRTupleT.
 //
 // Plain values: distinct objects may be used from different threads. All
 // operations are inline, unrolled per dimension and never allocate.
 #pragma once
 
+#include <krCoreLib/math/CKRTupleT.h>
 #include <krCoreLib/math/CKRVectorT.h>
 
-#include <cstring>
-#include <utility>
-
 template <int N, class Real, class Other>
-class CKRPointT {
-  static_assert(N >= 2 && N <= 4, "points have 2, 3 or 4 components");
+class CKRPointT : public CKRTupleT<CKRPointT<N, Real, Other>, Real, Other, N> {
+  using Tuple = CKRTupleT<CKRPointT, Real, Other, N>;
 
 public:
-  using Math = CKRMathT<Real, Other>;
+  using typename Tuple::Math;
   using Vector = CKRVectorT<N, Real, Other>;
 
   // Leaves the components uninitialised.
   CKRPointT() noexcept = default;
   constexpr CKRPointT(const CKRPointT& p) noexcept = default;
   // Copies N values; a null pointer gives the zero point.
-  explicit CKRPointT(const Real* tuple) noexcept {
-    ForEach([&](int i) { m_Tuple[i] = tuple != nullptr ? tuple[i] : Real(0); });
-  }
+  explicit CKRPointT(const Real* tuple) noexcept : Tuple(tuple) {}
   CKRPointT& operator=(const CKRPointT& p) noexcept = default;
-
-  // All components 0 (also for 4-D points); component i 1 and the others 0
-  // (the zero point for an index outside 0..N-1).
-  static CKRPointT ZERO() noexcept {
-    return Build([](int) { return Real(0); });
-  }
-  static CKRPointT UNIT(int i) noexcept {
-    CKRPointT p = ZERO();
-    if (i >= 0 && i < N)
-      p.m_Tuple[i] = Real(1);
-    return p;
-  }
-
-  // ---- raw access ----
-  Real& operator[](int i) noexcept { return m_Tuple[i]; }
-  Real operator[](int i) const noexcept { return m_Tuple[i]; }
-  operator Real*() noexcept { return m_Tuple; }
-  operator const Real*() const noexcept { return m_Tuple; }
-  Real* GetTuple() noexcept { return m_Tuple; }
-  const Real* GetTuple() const noexcept { return m_Tuple; }
-  static constexpr int GetN() noexcept { return N; }
-
-  // ---- comparison ----
-  bool operator==(const CKRPointT& p) const noexcept { return std::memcmp(m_Tuple, p.m_Tuple, sizeof m_Tuple) == 0; }
-  bool operator!=(const CKRPointT& p) const noexcept { return !(*this == p); }
-  bool operator<(const CKRPointT& p) const noexcept { return CompareArrays(p) < 0; }
-  bool operator<=(const CKRPointT& p) const noexcept { return CompareArrays(p) <= 0; }
-  bool operator>(const CKRPointT& p) const noexcept { return CompareArrays(p) > 0; }
-  bool operator>=(const CKRPointT& p) const noexcept { return CompareArrays(p) >= 0; }
-  // True when every component pair is equal after rounding to `decimals`
-  // decimal places (CKRMathT::Approx_Equal).
-  bool Approx_Equal(const CKRPointT& p, int decimals) const {
-    for (int i = 0; i < N; ++i)
-      if (!Math::Approx_Equal(m_Tuple[i], p.m_Tuple[i], decimals))
-        return false;
-    return true;
-  }
 
   // ---- affine arithmetic ----
   CKRPointT operator+(const Vector& v) const noexcept {
@@ -103,29 +59,19 @@ protected:
   // Components in order; for the dimension classes' constants (constexpr).
   template <class... Values>
     requires(sizeof...(Values) == N)
-  constexpr CKRPointT(std::in_place_t, Values... values) noexcept : m_Tuple{Real(values)...} {}
+  constexpr CKRPointT(std::in_place_t, Values... values) noexcept : Tuple(std::in_place, values...) {}
 
-  // -1, 0 or 1: the byte images of the components compared as unsigned
-  // bytes in memory order.
-  int CompareArrays(const CKRPointT& p) const noexcept {
-    const int order = std::memcmp(m_Tuple, p.m_Tuple, sizeof m_Tuple);
-    return (order > 0) - (order < 0);
-  }
-
-  // Calls function(i) for i = 0..N-1, unrolled.
-  template <class Function>
-  static constexpr void ForEach(Function&& function) {
-    [&]<int... I>(std::integer_sequence<int, I...>) { (function(I), ...); }(std::make_integer_sequence<int, N>{});
-  }
-  template <class Function>
-  static CKRPointT Build(Function&& function) {
-    CKRPointT p;
-    ForEach([&](int i) { p.m_Tuple[i] = function(i); });
-    return p;
-  }
-
-  Real m_Tuple[N];
+  using Tuple::Build;
+  using Tuple::ForEach;
+  using Tuple::m_Tuple;
 };
+
+extern template class KRCORELIB_API CKRTupleT<CKRPointT<2, float, double>, float, double, 2>;
+extern template class KRCORELIB_API CKRTupleT<CKRPointT<3, float, double>, float, double, 3>;
+extern template class KRCORELIB_API CKRTupleT<CKRPointT<4, float, double>, float, double, 4>;
+extern template class KRCORELIB_API CKRTupleT<CKRPointT<2, double, float>, double, float, 2>;
+extern template class KRCORELIB_API CKRTupleT<CKRPointT<3, double, float>, double, float, 3>;
+extern template class KRCORELIB_API CKRTupleT<CKRPointT<4, double, float>, double, float, 4>;
 
 extern template class KRCORELIB_API CKRPointT<2, float, double>;
 extern template class KRCORELIB_API CKRPointT<3, float, double>;

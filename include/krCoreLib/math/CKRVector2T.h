@@ -29,14 +29,9 @@ public:
   constexpr CKRVector2T(Real x, Real y) noexcept : Base(std::in_place, x, y) {}
   CKRVector2T& operator=(const CKRVector2T& v) noexcept = default;
 
-  void Set(Real x, Real y) noexcept {
-    this->m_Tuple[0] = x;
-    this->m_Tuple[1] = y;
-  }
-  Real X() const noexcept { return this->m_Tuple[0]; }
-  Real& X() noexcept { return this->m_Tuple[0]; }
-  Real Y() const noexcept { return this->m_Tuple[1]; }
-  Real& Y() noexcept { return this->m_Tuple[1]; }
+  using Base::Set;
+  using Base::X;
+  using Base::Y;
 
   // (y, -x): this vector turned clockwise by a right angle; UnitPerp
   // normalises it.

@@ -31,20 +31,11 @@ public:
   constexpr CKRVector4T(Real x, Real y, Real z, Real w) noexcept : Base(std::in_place, x, y, z, w) {}
   CKRVector4T& operator=(const CKRVector4T& v) noexcept = default;
 
-  void Set(Real x, Real y, Real z, Real w) noexcept {
-    this->m_Tuple[0] = x;
-    this->m_Tuple[1] = y;
-    this->m_Tuple[2] = z;
-    this->m_Tuple[3] = w;
-  }
-  Real X() const noexcept { return this->m_Tuple[0]; }
-  Real& X() noexcept { return this->m_Tuple[0]; }
-  Real Y() const noexcept { return this->m_Tuple[1]; }
-  Real& Y() noexcept { return this->m_Tuple[1]; }
-  Real Z() const noexcept { return this->m_Tuple[2]; }
-  Real& Z() noexcept { return this->m_Tuple[2]; }
-  Real W() const noexcept { return this->m_Tuple[3]; }
-  Real& W() noexcept { return this->m_Tuple[3]; }
+  using Base::Set;
+  using Base::W;
+  using Base::X;
+  using Base::Y;
+  using Base::Z;
 
   // The 3-D cross product of the x, y, z parts with w = 0; UnitCross
   // normalises all four components.

@@ -9,18 +9,16 @@
 // components[N] (x, y, z, w). The virtual functions, in slot order, are Cross
 // and UnitCross. Default construction leaves the components uninitialised.
 //
-// Equality compares the stored bits (0.0 and -0.0 differ; two NaNs with the
-// same bits are equal); <, <=, >, >= compare the byte images of the
-// components as unsigned bytes in memory order: a total order for sorted
-// containers, not a numeric one. Indexes are not checked: the caller keeps
-// them in 0..N-1. Dividing by 0 gives MAX_REAL in every component; a vector
-// not longer than EPSILON normalises to the zero vector.
+// Raw access, ZERO(), UNIT(), the comparisons (bits and byte images) and
+// Approx_Equal come from CKRTupleT, which has no virtual functions: the
+// table pointer stays first. Dividing by 0 gives MAX_REAL in every component;
+// a vector not longer than EPSILON normalises to the zero vector.
 //
 // Plain values: distinct objects may be used from different threads. The
 // hot operations are inline, unrolled per dimension and never allocate.
 #pragma once
 
-#include <krCoreLib/math/CKRMathT.h>
+#include <krCoreLib/math/CKRTupleT.h>
 
 #include <cstring>
 #include <utility>
@@ -29,23 +27,19 @@ template <int N, class Real, class Other>
 class CKRPointT;
 
 template <int N, class Real, class Other>
-class CKRVectorT {
-  static_assert(N >= 2 && N <= 4, "vectors have 2, 3 or 4 components");
+class CKRVectorT : public CKRTupleT<CKRVectorT<N, Real, Other>, Real, Other, N> {
+  using Tuple = CKRTupleT<CKRVectorT, Real, Other, N>;
 
 public:
-  using Math = CKRMathT<Real, Other>;
+  using typename Tuple::Math;
 
   // Leaves the components uninitialised.
   CKRVectorT() noexcept {}
   // Component by component, which lets the compiler keep temporaries in
   // registers (an aggregate array copy goes through memory).
-  constexpr CKRVectorT(const CKRVectorT& v) noexcept {
-    ForEach([&](int i) { m_Tuple[i] = v.m_Tuple[i]; });
-  }
+  constexpr CKRVectorT(const CKRVectorT& v) noexcept : Tuple(std::in_place, v) {}
   // Copies N values; a null pointer gives the zero vector.
-  explicit CKRVectorT(const Real* tuple) noexcept {
-    ForEach([&](int i) { m_Tuple[i] = tuple != nullptr ? tuple[i] : Real(0); });
-  }
+  explicit CKRVectorT(const Real* tuple) noexcept : Tuple(tuple) {}
   // The components of a point of the same dimension.
   explicit CKRVectorT(const CKRPointT<N, Real, Other>& point) noexcept {
     ForEach([&](int i) { m_Tuple[i] = point[i]; });
@@ -53,43 +47,6 @@ public:
   constexpr CKRVectorT& operator=(const CKRVectorT& v) noexcept {
     ForEach([&](int i) { m_Tuple[i] = v.m_Tuple[i]; });
     return *this;
-  }
-
-  // All components 0; component i 1 and the others 0 (the zero vector for an
-  // index outside 0..N-1).
-  static CKRVectorT ZERO() noexcept {
-    return Build([](int) { return Real(0); });
-  }
-  static CKRVectorT UNIT(int i) noexcept {
-    CKRVectorT v = ZERO();
-    if (i >= 0 && i < N)
-      v.m_Tuple[i] = Real(1);
-    return v;
-  }
-
-  // ---- raw access ----
-  Real& operator[](int i) noexcept { return m_Tuple[i]; }
-  Real operator[](int i) const noexcept { return m_Tuple[i]; }
-  operator Real*() noexcept { return m_Tuple; }
-  operator const Real*() const noexcept { return m_Tuple; }
-  Real* GetTuple() noexcept { return m_Tuple; }
-  const Real* GetTuple() const noexcept { return m_Tuple; }
-  static constexpr int GetN() noexcept { return N; }
-
-  // ---- comparison ----
-  bool operator==(const CKRVectorT& v) const noexcept { return std::memcmp(m_Tuple, v.m_Tuple, sizeof m_Tuple) == 0; }
-  bool operator!=(const CKRVectorT& v) const noexcept { return !(*this == v); }
-  bool operator<(const CKRVectorT& v) const noexcept { return CompareArrays(v) < 0; }
-  bool operator<=(const CKRVectorT& v) const noexcept { return CompareArrays(v) <= 0; }
-  bool operator>(const CKRVectorT& v) const noexcept { return CompareArrays(v) > 0; }
-  bool operator>=(const CKRVectorT& v) const noexcept { return CompareArrays(v) >= 0; }
-  // True when every component pair is equal after rounding to `decimals`
-  // decimal places (CKRMathT::Approx_Equal).
-  bool Approx_Equal(const CKRVectorT& v, int decimals) const {
-    for (int i = 0; i < N; ++i)
-      if (!Math::Approx_Equal(m_Tuple[i], v.m_Tuple[i], decimals))
-        return false;
-    return true;
   }
 
   // ---- arithmetic ----
@@ -198,35 +155,26 @@ protected:
   // Components in order; for the dimension classes' constants (constexpr).
   template <class... Values>
     requires(sizeof...(Values) == N)
-  constexpr CKRVectorT(std::in_place_t, Values... values) noexcept : m_Tuple{Real(values)...} {}
+  constexpr CKRVectorT(std::in_place_t, Values... values) noexcept : Tuple(std::in_place, values...) {}
 
-  // -1, 0 or 1: the byte images of the components compared as unsigned
-  // bytes in memory order.
-  int CompareArrays(const CKRVectorT& v) const noexcept {
-    const int order = std::memcmp(m_Tuple, v.m_Tuple, sizeof m_Tuple);
-    return (order > 0) - (order < 0);
-  }
-
-  // Calls function(i) for i = 0..N-1, unrolled.
-  template <class Function>
-  static constexpr void ForEach(Function&& function) {
-    [&]<int... I>(std::integer_sequence<int, I...>) { (function(I), ...); }(std::make_integer_sequence<int, N>{});
-  }
   // function(0) + function(1) + ..., left to right.
   template <class Function>
   static constexpr Real Sum(Function&& function) {
     return [&]<int... I>(std::integer_sequence<int, I...>) { return (... + function(I)); }(
         std::make_integer_sequence<int, N>{});
   }
-  template <class Function>
-  static CKRVectorT Build(Function&& function) {
-    CKRVectorT v;
-    ForEach([&](int i) { v.m_Tuple[i] = function(i); });
-    return v;
-  }
 
-  Real m_Tuple[N];
+  using Tuple::Build;
+  using Tuple::ForEach;
+  using Tuple::m_Tuple;
 };
+
+extern template class KRCORELIB_API CKRTupleT<CKRVectorT<2, float, double>, float, double, 2>;
+extern template class KRCORELIB_API CKRTupleT<CKRVectorT<3, float, double>, float, double, 3>;
+extern template class KRCORELIB_API CKRTupleT<CKRVectorT<4, float, double>, float, double, 4>;
+extern template class KRCORELIB_API CKRTupleT<CKRVectorT<2, double, float>, double, float, 2>;
+extern template class KRCORELIB_API CKRTupleT<CKRVectorT<3, double, float>, double, float, 3>;
+extern template class KRCORELIB_API CKRTupleT<CKRVectorT<4, double, float>, double, float, 4>;
 
 extern template class KRCORELIB_API CKRVectorT<2, float, double>;
 extern template class KRCORELIB_API CKRVectorT<3, float, double>;
