@@ -1,10 +1,24 @@
-// The two precision pairs every math test runs through, and tolerances that
-// depend on the precision.
+// The two precision pairs every math test runs through, the classes of a
+// pair, and tolerances that depend on the precision.
 #pragma once
+
+#include <krCoreLib/math/CKRMathT.h>
+#include <krCoreLib/math/CKRPoint2T.h>
+#include <krCoreLib/math/CKRPoint3T.h>
+#include <krCoreLib/math/CKRPoint4T.h>
+#include <krCoreLib/math/CKRVector2T.h>
+#include <krCoreLib/math/CKRVector3T.h>
+#include <krCoreLib/math/CKRVector4T.h>
+
+#include "KRTestSeed.h"
 
 #include <gtest/gtest.h>
 
+#include <cmath>
+#include <limits>
+#include <numbers>
 #include <ostream>
+#include <random>
 #include <string>
 #include <type_traits>
 
@@ -13,6 +27,18 @@ struct KRPrecisionPair {
   using Real = TReal;
   using Other = TOther;
 };
+
+// The classes of the pair under test, by their short names, in a typed test.
+#define KR_MATH_TEST_TYPES                                   \
+  using Real [[maybe_unused]] = typename TypeParam::Real;    \
+  using Other [[maybe_unused]] = typename TypeParam::Other;  \
+  using M [[maybe_unused]] = CKRMathT<Real, Other>;          \
+  using V2 [[maybe_unused]] = CKRVector2T<Real, Other>;      \
+  using V3 [[maybe_unused]] = CKRVector3T<Real, Other>;      \
+  using V4 [[maybe_unused]] = CKRVector4T<Real, Other>;      \
+  using P2 [[maybe_unused]] = CKRPoint2T<Real, Other>;       \
+  using P3 [[maybe_unused]] = CKRPoint3T<Real, Other>;       \
+  using P4 [[maybe_unused]] = CKRPoint4T<Real, Other>
 
 using KRPrecisionPairs = ::testing::Types<KRPrecisionPair<float, double>, KRPrecisionPair<double, float>>;
 
@@ -29,25 +55,12 @@ constexpr double KRByPrecision(double single, double twice) {
   return std::is_same_v<Real, float> ? single : twice;
 }
 
-template <int N, class Real, class Other>
-class CKRVectorT;
-template <int N, class Real, class Other>
-class CKRPointT;
-
 // Failure messages show the components (the classes also convert to
 // pointers, which GoogleTest would print otherwise).
-template <class Tuple>
-void KRPrintTuple(const Tuple& tuple, int n, std::ostream* out) {
+template <template <int, class, class> class Tuple, int N, class Real, class Other>
+void PrintTo(const Tuple<N, Real, Other>& tuple, std::ostream* out) {
   *out << "(";
-  for (int i = 0; i < n; ++i)
+  for (int i = 0; i < N; ++i)
     *out << (i > 0 ? ", " : "") << tuple[i];
   *out << ")";
-}
-template <int N, class Real, class Other>
-void PrintTo(const CKRVectorT<N, Real, Other>& v, std::ostream* out) {
-  KRPrintTuple(v, N, out);
-}
-template <int N, class Real, class Other>
-void PrintTo(const CKRPointT<N, Real, Other>& p, std::ostream* out) {
-  KRPrintTuple(p, N, out);
 }
