@@ -259,8 +259,9 @@ public:
   static int ArcCenterRadiusStartAngleArcAngle_to_StartMiddleEnd(const Point4& center, Real r, Real start, Real sweep,
                                                                  Point4* s, Point4* m, Point4* e);
   // Arc from its start, its heading there and its end; the sweep is signed
-  // (positive counter-clockwise). 0 when the arc would be (nearly) straight
-  // or a half circle or more, and when start and end coincide.
+  // (positive counter-clockwise), less than a full turn. 0 when the arc
+  // would be (nearly) straight or (nearly) a full circle, and when start and
+  // end coincide.
   static int ArcStartDirectionEnd_to_CenterRadiusStartAngleArcAngle(Real sx, Real sy, Real dir, Real ex, Real ey,
                                                                     Real* cx, Real* cy, Real* r, Real* start,
                                                                     Real* sweep);
