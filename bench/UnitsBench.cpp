@@ -10,15 +10,13 @@
 // "psig"); each side converts the pair in its own notation.
 #include <krCoreLib/units/KRUnitConversion.h>
 
+#include "KRAllocationCounter.h"
+
 #include <benchmark/benchmark.h>
 #include <udunits2.h>
 
-#include <cstdlib>
-#include <new>
 
 namespace {
-
-thread_local std::size_t t_Allocations = 0;
 
 struct SKRPair {
   const wchar_t* m_pFrom;
@@ -47,14 +45,14 @@ void BM_ConvertUnitValue(benchmark::State& state) {
   const SKRPair& pair = kPairs[state.range(0)];
   double value = 1.0;
   state.counters["converts"] = ConvertUnitValue(value, pair.m_pFrom, pair.m_pTo) ? 1 : 0;
-  const std::size_t allocations = t_Allocations;
-  for (auto _ : state) {
-    double converted = 1.0;
-    benchmark::DoNotOptimize(ConvertUnitValue(converted, pair.m_pFrom, pair.m_pTo));
-    benchmark::DoNotOptimize(converted);
+  {
+    AllocationProbe probe(state);
+    for (auto _ : state) {
+      double converted = 1.0;
+      benchmark::DoNotOptimize(ConvertUnitValue(converted, pair.m_pFrom, pair.m_pTo));
+      benchmark::DoNotOptimize(converted);
+    }
   }
-  state.counters["allocs/iter"] =
-      benchmark::Counter(double(t_Allocations - allocations), benchmark::Counter::kAvgIterations);
   state.counters["value"] = value;
   state.SetItemsProcessed(state.iterations());
 }
@@ -82,21 +80,6 @@ void BM_Udunits2(benchmark::State& state) {
 }
 
 }  // namespace
-
-// Counts every allocation of the program, the library's included.
-// (malloc and free behind operator new and delete, as the C++ library does.)
-void* operator new(std::size_t size) {
-  ++t_Allocations;
-  if (void* block = std::malloc(size ? size : 1))
-    return block;
-  throw std::bad_alloc();
-}
-void operator delete(void* block) noexcept {
-  std::free(block);  // NOLINT: pairs with the malloc in operator new
-}
-void operator delete(void* block, std::size_t) noexcept {
-  std::free(block);
-}
 
 BENCHMARK(BM_ConvertUnitValue)->DenseRange(0, 3)->ArgName("pair");
 BENCHMARK(BM_Udunits2)->DenseRange(0, 3)->ArgName("pair");

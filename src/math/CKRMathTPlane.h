@@ -110,10 +110,8 @@ Real CKRMathT<Real, Other>::GetRightAngle(const Point4& p1, const Point4& p2, co
 
 template <class Real, class Other>
 Real CKRMathT<Real, Other>::GetLeftAngle(Real x1, Real y1, Real x2, Real y2, Real x3, Real y3) {
-  Real a = GetAngle(x2, y2, x1, y1) - GetAngle(x2, y2, x3, y3);
-  if (a < Real(0))
-    a += TWO_PI;
-  return a;
+  // The angle on the left of 1-2-3 is the one on the right of 3-2-1.
+  return GetRightAngle(x3, y3, x2, y2, x1, y1);
 }
 
 template <class Real, class Other>
