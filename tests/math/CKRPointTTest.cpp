@@ -52,6 +52,27 @@ TYPED_TEST(CKRPointTTest, PackedCoordinatesAndAffineOperations) {
   EXPECT_TRUE(moved.Approx_Equal(P4(Real(1), Real(3), Real(5), Real(1)), 5));
 }
 
+// Integer arguments (literals) pick the Real constructor and Set: they are
+// equally close to both precisions, and must not round through the other one.
+TYPED_TEST(CKRPointTTest, IntegerArgumentsUseReal) {
+  KR_MATH_TEST_TYPES;
+  constexpr P4 homogeneous(0, 0, 0, 1);
+  EXPECT_EQ(homogeneous, P4::ZERO);
+  EXPECT_EQ(V3(0, 0, 1), V3::UNIT_Z);
+  EXPECT_EQ(P2(3, -4u), P2(Real(3), Real(-4.0 + 4294967296.0)));
+  // 2^24 + 1 has no float form: a double pair keeps it exactly.
+  const P3 big(16777217, 0L, short(2));
+  EXPECT_EQ(big.X(), Real(16777217));
+  P3 set = P3::ZERO;
+  set.Set(1, 2, 3);
+  EXPECT_EQ(set, TestFixture::Pt(1, 2, 3));
+  V3 vector = V3::ZERO;
+  vector.Set(0, 1, 0);
+  EXPECT_EQ(vector, V3::UNIT_Y);
+  // Calls of one precision keep their constructors.
+  EXPECT_EQ(P2(Other(0.1), Other(0.2)), P2(Real(Other(0.1)), Real(Other(0.2))));
+}
+
 // "%f" for every component, the same digits as the C library's in the C
 // locale, and read back to the same text.
 TYPED_TEST(CKRPointTTest, ToStringWritesSixDecimalsAndReadsBack) {

@@ -27,10 +27,19 @@ public:
   explicit CKRPoint2T(const Real* tuple) noexcept : Base(tuple) {}
   constexpr CKRPoint2T(Real x, Real y) noexcept : Base(std::in_place, x, y) {}
   constexpr CKRPoint2T(Other x, Other y) noexcept : Base(std::in_place, Real(x), Real(y)) {}
+  // Integers (literals) use Real: they are equally close to both precisions.
+  template <class... Ints>
+    requires KRIntegerArguments<2, Ints...>
+  constexpr CKRPoint2T(Ints... values) noexcept : Base(std::in_place, Real(values)...) {}
   CKRPoint2T& operator=(const CKRPoint2T& p) noexcept = default;
 
   using Base::Set;
   void Set(Other x, Other y) noexcept { Set(Real(x), Real(y)); }
+  template <class... Ints>
+    requires KRIntegerArguments<2, Ints...>
+  void Set(Ints... values) noexcept {
+    Set(Real(values)...);
+  }
   using Base::SetX;
   using Base::SetY;
   using Base::X;

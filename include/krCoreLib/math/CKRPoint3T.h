@@ -28,10 +28,19 @@ public:
   explicit CKRPoint3T(const Real* tuple) noexcept : Base(tuple) {}
   constexpr CKRPoint3T(Real x, Real y, Real z) noexcept : Base(std::in_place, x, y, z) {}
   constexpr CKRPoint3T(Other x, Other y, Other z) noexcept : Base(std::in_place, Real(x), Real(y), Real(z)) {}
+  // Integers (literals) use Real: they are equally close to both precisions.
+  template <class... Ints>
+    requires KRIntegerArguments<3, Ints...>
+  constexpr CKRPoint3T(Ints... values) noexcept : Base(std::in_place, Real(values)...) {}
   CKRPoint3T& operator=(const CKRPoint3T& p) noexcept = default;
 
   using Base::Set;
   void Set(Other x, Other y, Other z) noexcept { Set(Real(x), Real(y), Real(z)); }
+  template <class... Ints>
+    requires KRIntegerArguments<3, Ints...>
+  void Set(Ints... values) noexcept {
+    Set(Real(values)...);
+  }
   using Base::SetX;
   using Base::SetY;
   using Base::SetZ;

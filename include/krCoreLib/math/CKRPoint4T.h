@@ -31,10 +31,19 @@ public:
   constexpr CKRPoint4T(Real x, Real y, Real z, Real w) noexcept : Base(std::in_place, x, y, z, w) {}
   constexpr CKRPoint4T(Other x, Other y, Other z, Other w) noexcept
       : Base(std::in_place, Real(x), Real(y), Real(z), Real(w)) {}
+  // Integers (literals) use Real: they are equally close to both precisions.
+  template <class... Ints>
+    requires KRIntegerArguments<4, Ints...>
+  constexpr CKRPoint4T(Ints... values) noexcept : Base(std::in_place, Real(values)...) {}
   CKRPoint4T& operator=(const CKRPoint4T& p) noexcept = default;
 
   using Base::Set;
   void Set(Other x, Other y, Other z, Other w) noexcept { Set(Real(x), Real(y), Real(z), Real(w)); }
+  template <class... Ints>
+    requires KRIntegerArguments<4, Ints...>
+  void Set(Ints... values) noexcept {
+    Set(Real(values)...);
+  }
   using Base::SetX;
   using Base::SetY;
   using Base::SetZ;

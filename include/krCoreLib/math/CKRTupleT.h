@@ -24,7 +24,14 @@
 #include <krCoreLib/math/CKRMathT.h>
 
 #include <cstring>
+#include <type_traits>
 #include <utility>
+
+// N integer arguments, such as the literals of (0, 0, 1): an int converts
+// equally well to float and to double, so the dimension classes that take
+// both precisions add a constructor and Set for integers that use Real.
+template <int N, class... Values>
+concept KRIntegerArguments = sizeof...(Values) == N && (std::is_integral_v<Values> && ...);
 
 template <class Derived, class Real, class Other, int N>
 class CKRTupleT {

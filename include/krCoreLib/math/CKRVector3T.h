@@ -31,10 +31,19 @@ public:
   explicit CKRVector3T(const CKRPointT<3, Real, Other>& point) noexcept : Base(point) {}
   constexpr CKRVector3T(Real x, Real y, Real z) noexcept : Base(std::in_place, x, y, z) {}
   constexpr CKRVector3T(Other x, Other y, Other z) noexcept : Base(std::in_place, Real(x), Real(y), Real(z)) {}
+  // Integers (literals) use Real: they are equally close to both precisions.
+  template <class... Ints>
+    requires KRIntegerArguments<3, Ints...>
+  constexpr CKRVector3T(Ints... values) noexcept : Base(std::in_place, Real(values)...) {}
   CKRVector3T& operator=(const CKRVector3T& v) noexcept = default;
 
   using Base::Set;
   void Set(Other x, Other y, Other z) noexcept { Set(Real(x), Real(y), Real(z)); }
+  template <class... Ints>
+    requires KRIntegerArguments<3, Ints...>
+  void Set(Ints... values) noexcept {
+    Set(Real(values)...);
+  }
   using Base::X;
   using Base::Y;
   using Base::Z;
