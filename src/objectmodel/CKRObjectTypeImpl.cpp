@@ -18,9 +18,16 @@ CKRObjectTypeImpl::~CKRObjectTypeImpl() {
   CKRTypeSystem::RemoveDestroyedType(this);
   if (m_pParentType != nullptr)
     m_pParentType->RemoveChildType(this);
+  DetachChildTypes();
+}
+
+void CKRObjectTypeImpl::DetachChildTypes() {
+  // A child that still names this type as its parent would follow the link
+  // (IsTypeOf) after this type is released or destroyed.
   for (const auto& [id, child] : m_ChildTypeMap)
     if (auto* impl = dynamic_cast<CKRObjectTypeImpl*>(child); impl != nullptr && impl->m_pParentType == this)
       impl->m_pParentType = nullptr;
+  m_ChildTypeMap.clear();
 }
 
 CKRGuid CKRObjectTypeImpl::GetID() {
@@ -81,7 +88,7 @@ void CKRObjectTypeImpl::Release() {
     CKRDebugOutput::Printf(L"Warning! %d instances of class %s were not released\n", count, m_Name.GetString());
     m_InstanceMap.RemoveAll(true);
   }
-  m_ChildTypeMap.clear();
+  DetachChildTypes();
   if (m_pParentType != nullptr)
     m_pParentType->RemoveChildType(this);
   // Back to the state of a type that was never claimed, so that the type

@@ -2,6 +2,7 @@
 
 #include <krCoreLib/objectmodel/CKRObjectImpl.h>
 
+#include <algorithm>
 #include <vector>
 
 // Constant-initialised, so registrations made while any module's static
@@ -14,6 +15,18 @@ namespace {
 // dropped them: the roots that every other type derives from.
 std::vector<IKRObjectType*> BaseTypes() {
   return {CKRObjectImpl::GetCKRObjectImplType()};
+}
+
+// Type objects that live on after the type system let go of them: released
+// with their repository or dropped by Release while their module stays
+// loaded (the library's own types, or a plug-in the loader keeps mapped).
+// The next Initialize registers them again, so that a module claimed again
+// finds its types. A type object that is destroyed leaves the list. Never
+// destroyed itself: type objects of modules unloaded at exit still remove
+// themselves from it after other function-local statics are gone.
+std::vector<IKRObjectType*>& DormantTypes() {
+  static auto* s_pTypes = new std::vector<IKRObjectType*>();
+  return *s_pTypes;
 }
 
 // Removes the entry under `id` when it holds `type`.
@@ -93,6 +106,12 @@ void CKRTypeSystem::_Initialize(CKRGuid repositoryID) {
   for (IKRObjectType* base : BaseTypes())
     if (_FindType(base->GetID()) == nullptr)
       _AddType(base);
+  // In the order they were let go; a type whose ID has been taken since by
+  // another type object stays out, as any second type with that ID.
+  std::vector<IKRObjectType*>& dormant = DormantTypes();
+  for (IKRObjectType* type : dormant)
+    _AddType(type);
+  dormant.clear();
 
   CKRTypeRepository*& repository = m_RepositoryMap[repositoryID];
   if (repository == nullptr)
@@ -131,6 +150,7 @@ CKRTypeIterator::TypeMap::iterator CKRTypeSystem::ReleaseEntry(CKRTypeIterator::
   const auto next = types.erase(at);
   EraseIfHolds(m_GlobalTypeMap, id, type);
   type->Release();
+  DormantTypes().push_back(type);
   return next;
 }
 
@@ -173,14 +193,23 @@ void CKRTypeSystem::_Release() {
     ReleaseLeavesFirst(*repository);
     delete repository;
   }
+  // Registered but never claimed: not released, but registered again by the
+  // next Initialize like the released ones.
+  for (const auto& [id, type] : m_GlobalTypeMap)
+    DormantTypes().push_back(type);
+  m_GlobalTypeMap.clear();
   if (m_pInstance == this)
     m_pInstance = nullptr;
   delete this;
 }
 
 void CKRTypeSystem::RemoveDestroyedType(IKRObjectType* type) {
+  if (type == nullptr)
+    return;
+  std::vector<IKRObjectType*>& dormant = DormantTypes();
+  dormant.erase(std::remove(dormant.begin(), dormant.end(), type), dormant.end());
   CKRTypeSystem* system = m_pInstance;
-  if (system == nullptr || type == nullptr)
+  if (system == nullptr)
     return;
   const CKRGuid id = type->GetID();
   EraseIfHolds(system->m_GlobalTypeMap, id, type);

@@ -4,6 +4,9 @@
 
 #include <gtest/gtest.h>
 
+#include <dlfcn.h>
+
+#include <algorithm>
 #include <memory>
 
 namespace {
@@ -19,10 +22,13 @@ constexpr CKRGuid kLeafID = CKRGuid::Literal("{30000000-0000-4000-8000-000000000
 using Log = std::vector<std::wstring>;
 using Types = std::vector<IKRObjectType*>;
 
+// The types of an iteration, without the static test types that every
+// Initialize claims again once they were released.
 Types Walk(CKRTypeIterator it) {
   Types types;
   for (IKRObjectType* type = it.Next(1); type != nullptr; type = it.Next(0))
-    types.push_back(type);
+    if (!type->IsTypeOf(CKRTestItem::TypeID) && type->GetID() != CKRTestAbstract::TypeID)
+      types.push_back(type);
   return types;
 }
 
@@ -112,18 +118,20 @@ TEST_F(CKRTypeSystemTest, ReleaseGoesLeavesFirst) {
   EXPECT_TRUE(CKRTypeSystem::FindType(CKRObjectImpl::TypeID) == nullptr && CKRTypeSystem::FindType(kRootID) == nullptr);
   EXPECT_EQ(root.GetRepositoryID(), CKRGuid());
 
-  // Released types can be claimed again, and the library's root type comes
-  // back with Initialize. A type whose derived type lives in another
-  // repository never becomes a leaf of its own, yet Release still ends.
-  EXPECT_EQ(CKRTypeSystem::AddType(&root), 1);
+  // The living types come back with the next Initialize, the library's root
+  // type among them, linked again.
   CKRTypeSystem::Initialize(kHostRepository);
   EXPECT_EQ(CKRTypeSystem::FindType(CKRObjectImpl::TypeID), CKRObjectImpl::GetCKRObjectImplType());
-  EXPECT_EQ(CKRTypeSystem::AddType(&child), 1);
+  EXPECT_EQ(CKRTypeSystem::FindType(kLeafID), &leaf);
+  EXPECT_EQ(leaf.IsTypeOf(kRootID), 1);
+  // A type whose derived type lives in another repository never becomes a
+  // leaf of its own, yet Release still ends.
+  CKRLocalType late(L"Late", CKRGuid::Literal("{40000000-0000-4000-8000-000000000000}"), kRootID, &log);
   CKRTypeSystem::Initialize(kPluginRepository);
-  EXPECT_EQ(child.GetRepositoryID(), kPluginRepository);
+  EXPECT_EQ(late.GetRepositoryID(), kPluginRepository);
   log.clear();
   CKRTypeSystem::Release();
-  EXPECT_EQ(log, (Log{L"release Root", L"release Child"}));
+  EXPECT_EQ(log, (Log{L"release Leaf", L"release Child", L"release Root", L"release Late"}));
 }
 
 TEST_F(CKRTypeSystemTest, DestroyedTypeLeavesNoDanglingLinks) {
@@ -144,4 +152,48 @@ TEST_F(CKRTypeSystemTest, DestroyedTypeLeavesNoDanglingLinks) {
   parent.reset();
   EXPECT_EQ(orphan.GetParentType(), nullptr);
   EXPECT_EQ(orphan.IsTypeOf(kChildID), 0);
+  // So does a parent released (its repository went first) and then
+  // destroyed before its derived type.
+  parent = std::make_unique<CKRLocalType>(L"Parent", kChildID);
+  ASSERT_EQ(orphan.RegisterWithParentType(parent.get()), 1);
+  parent->Release();
+  parent.reset();
+  EXPECT_EQ(orphan.GetParentType(), nullptr);
+  EXPECT_EQ(orphan.IsTypeOf(kChildID), 0);
+}
+
+// A plug-in module built with default options: loaded, claimed, released and
+// unloaded three times, its type is found after every load, and the loader
+// really unmaps it. Then the same while the loader keeps it mapped
+// (RTLD_NODELETE): its static type object is never constructed again, and
+// still its type comes back with the next Initialize.
+TEST_F(CKRTypeSystemTest, PluginModuleTypesComeBackAfterReload) {
+  constexpr CKRGuid kPluginTypeID = CKRGuid::Literal("{7C0D2E1F-0000-4000-8000-0000000000A1}");
+  CKRTypeSystem::Initialize(kHostRepository);
+  for (const bool keepMapped : {false, true}) {
+    for (int round = 0; round < 3; ++round) {
+      SCOPED_TRACE(testing::Message() << "keep mapped " << keepMapped << ", round " << round);
+      void* module = dlopen(KR_TEST_PLUGIN_PATH, RTLD_NOW | RTLD_LOCAL | (keepMapped ? RTLD_NODELETE : 0));
+      ASSERT_NE(module, nullptr) << dlerror();
+      CKRTypeSystem::Initialize(kPluginRepository);
+      IKRObjectType* type = CKRTypeSystem::FindType(kPluginTypeID);
+      ASSERT_NE(type, nullptr);
+      EXPECT_EQ(type->GetRepositoryID(), kPluginRepository);
+      EXPECT_EQ(type->IsTypeOf(CKRObjectImpl::TypeID), 1);
+      IKRObject* object = type->CreateInstance(CKRGuid());
+      ASSERT_NE(object, nullptr);
+      EXPECT_EQ(type->GetInstance(object->GetInstanceID()), object);
+      EXPECT_EQ(object->Release(), 1);
+      CKRTypeSystem::ReleaseRepository(kPluginRepository);
+      EXPECT_EQ(CKRTypeSystem::FindType(kPluginTypeID), nullptr);
+      Types derived;
+      CKRObjectImpl::GetCKRObjectImplType()->GetDerivedTypes(derived);
+      EXPECT_EQ(std::count(derived.begin(), derived.end(), type), 0);
+      ASSERT_EQ(dlclose(module), 0);
+      void* still = dlopen(KR_TEST_PLUGIN_PATH, RTLD_NOW | RTLD_NOLOAD);
+      EXPECT_EQ(still != nullptr, keepMapped);
+      if (still != nullptr)
+        dlclose(still);
+    }
+  }
 }

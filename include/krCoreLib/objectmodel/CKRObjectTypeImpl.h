@@ -66,6 +66,10 @@ protected:
   int m_IsAbstract = 0;
 
 private:
+  // Clears the parent link of every child that still points here, then the
+  // child map.
+  void DetachChildTypes();
+
   CKRGuid m_TypeID;
   CKRGuid m_RepositoryID;
   CKRGuid m_ParentTypeID;

@@ -8,6 +8,13 @@
 // (types register), Initialize once per module that brings types,
 // ReleaseRepository before such a module is unloaded, Release at shutdown.
 //
+// A released type is no longer found, but its type object lives on as long
+// as its module: whether or not the loader really unmaps a module that was
+// released and unloaded, its types are registered again when it is loaded
+// and the next Initialize runs (a type object destroyed with its module
+// removes itself; one constructed again registers itself). The same holds
+// for the library's own types after Release.
+//
 // All operations are static and work on the single instance, created on
 // first use. No locks are taken: registration happens while modules load,
 // and the host calls Initialize, ReleaseRepository and Release from one
@@ -23,15 +30,18 @@ public:
   static int AddType(IKRObjectType* type);
   // The registered type with that ID, or null.
   static IKRObjectType* FindType(CKRGuid typeID);
-  // Claims every unclaimed type into the repository `repositoryID` (created
-  // when new): first links all of them to their parents, then initialises
-  // each and sets its repository, in ascending type-ID order.
+  // Registers again the living types that an earlier release let go of
+  // (unless another type took the ID meanwhile), then claims every unclaimed
+  // type into the repository `repositoryID` (created when new): first links
+  // all of them to their parents, then initialises each and sets its
+  // repository, in ascending type-ID order.
   static void Initialize(CKRGuid repositoryID);
   // Releases the repository's types in ascending ID order, then the
   // repository; an unknown ID does nothing.
   static void ReleaseRepository(CKRGuid repositoryID);
   // Releases every repository (each type after the types derived from it),
-  // then the type system itself; a later call starts a new, empty one.
+  // then the type system itself; a later call starts a new, empty one, in
+  // which the living types are found again after the next Initialize.
   static void Release();
   static CKRTypeIterator GetGlobalIterator();
   // An unbound iterator for an unknown repository.

@@ -30,9 +30,13 @@
 
 #include <krCoreLib/objectmodel/CKRObjectTypeImpl.h>
 
+// TypeID is a constant that every module keeps to itself (hidden): an
+// exported inline constant would become a process-wide unique symbol, and the
+// dynamic loader never unmaps a module that defines one, so a plug-in could
+// not be unloaded.
 #define KR_DECLARE_OBJECT_TYPE(Class, TypeBase, TypeIDText)                 \
 public:                                                                     \
-  static constexpr CKRGuid TypeID = CKRGuid::Literal(TypeIDText);           \
+  KRCORELIB_LOCAL static constexpr CKRGuid TypeID = CKRGuid::Literal(TypeIDText);  \
   class Class##Type : public TypeBase {                                     \
   public:                                                                   \
     Class##Type();                                                          \
