@@ -3,10 +3,14 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cstdio>
+#include <cstdlib>
 #include <latch>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <unistd.h>
 
 namespace {
 
@@ -39,6 +43,13 @@ protected:
   }
 };
 
+// Its release ends it and then creates 'P', of the same size: the allocator
+// may place 'P' where the released singleton was.
+class CReplacingBase : public CKRSingleton {
+protected:
+  void Release() override;
+};
+
 // 'U' creates 'D' in its constructor and looks at it in its destructor; 'L'
 // creates 'C' while it is released.
 template <char Name, class TBase = CKRSingleton>
@@ -64,6 +75,25 @@ using CA = CNamed<'A'>;
 using CB = CNamed<'B'>;
 using CC = CNamed<'C'>;
 using CRecorded = CNamed<'R', CRecordingBase>;
+
+void CReplacingBase::Release() {
+  CKRSingleton::Release();
+  CNamed<'P'>::GetInstance();
+}
+
+// Its destructor waits for a thread that asks for another singleton.
+class CJoiner : public CKRSingletonT<CJoiner> {
+  friend class CKRSingletonT<CJoiner>;
+  ~CJoiner() override {
+    std::thread([] { CB::GetInstance(); }).join();
+  }
+};
+
+// Reports its release on standard error, for tests that end the process.
+class CExitReporter : public CKRSingletonT<CExitReporter> {
+  friend class CKRSingletonT<CExitReporter>;
+  ~CExitReporter() override { std::fputs("released at exit\n", stderr); }
+};
 
 }  // namespace
 
@@ -102,6 +132,8 @@ TEST(CKRSingleton, ReleaseAllReleasesInCreationOrder) {
       {"created during ReleaseAll", [] { CNamed<'L'>::GetInstance(), CA::GetInstance(); },
        {"+L", "+A", "-L", "+C", "-A", "-C"}},
       {"derived Release slot", [] { CRecorded::GetInstance(); }, {"+R", "Release", "-R"}},
+      {"created during ReleaseAll where the released one was", [] { CNamed<'Q', CReplacingBase>::GetInstance(); },
+       {"+Q", "-Q", "+P", "-P"}},
   };
   for (const Case& c : cases) {
     SCOPED_TRACE(c.what);
@@ -110,7 +142,7 @@ TEST(CKRSingleton, ReleaseAllReleasesInCreationOrder) {
     CKRSingleton::ReleaseAll();
     EXPECT_EQ(Events(), c.expected);
     EXPECT_EQ(CKRSingleton::GetCount(), 0);
-    EXPECT_FALSE(CA::HasInstance() || CC::HasInstance());
+    EXPECT_FALSE(CA::HasInstance() || CC::HasInstance() || CNamed<'P'>::HasInstance());
   }
 }
 
@@ -135,4 +167,27 @@ TEST(CKRSingleton, ConcurrentGetInstanceCreatesOneInstance) {
     EXPECT_EQ(std::count(seen.begin(), seen.end(), seen[0]), kThreads);
     CKRSingleton::ReleaseAll();
   }
+}
+
+// The host's last call at exit: from an exit handler registered before the
+// first singleton existed (a fresh process, so that nothing else created the
+// registry earlier), and with a destructor that waits for a thread asking for
+// a singleton (which must not wait for the releasing thread's lock).
+TEST(CKRSingleton, ReleaseAllIsSafeAsTheLastCallAtExit) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  EXPECT_EXIT(
+      {
+        std::atexit([] { CKRSingleton::ReleaseAll(); });
+        CExitReporter::GetInstance();
+        std::exit(0);
+      },
+      testing::ExitedWithCode(0), "released at exit");
+  EXPECT_EXIT(
+      {
+        alarm(20);  // a deadlock ends the child with SIGALRM
+        CJoiner::GetInstance();
+        CKRSingleton::ReleaseAll();
+        std::exit(CKRSingleton::GetCount() == 0 && !CB::HasInstance() ? 0 : 1);
+      },
+      testing::ExitedWithCode(0), "");
 }

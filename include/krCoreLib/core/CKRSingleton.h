@@ -9,7 +9,11 @@
 //
 // Thread safety: GetInstance, ReleaseInstance and ReleaseAll may be called
 // from any thread; a singleton that another thread is still using must not be
-// released (releasing ends its life).
+// released (releasing ends its life). A singleton is taken out of the
+// registry and out of GetInstance's reach under the singleton lock, but
+// released after the lock is let go: its destructor may wait for threads
+// that ask for singletons. The registry itself is never destroyed, so
+// ReleaseAll is safe from any exit handler, however early it was registered.
 #pragma once
 
 #include <krCoreLib/core/KRExport.h>
@@ -19,8 +23,9 @@
 
 class KRCORELIB_API CKRSingleton {
 public:
-  // Releases every registered singleton, oldest first. Singletons created
-  // while this runs are released too.
+  // Releases every registered singleton, oldest first, each once. Singletons
+  // created while this runs (by a release, or on another thread) are
+  // released too.
   static void ReleaseAll();
 
   // Number of registered (live) singletons.
@@ -35,9 +40,26 @@ protected:
   // The release slot: ends the singleton's life. The default deletes it.
   virtual void Release();
 
-  // Serialises creation and release of all singletons. Recursive, so that a
-  // singleton's constructor may create the singletons it depends on.
+  // Serialises creation of singletons and changes to the registry.
+  // Recursive, so that a singleton's constructor may create the singletons
+  // it depends on.
   static std::recursive_mutex& GetLock();
+
+  // The instance slot of GetInstance.
+  using Slot = std::atomic<CKRSingleton*>;
+  // Makes `created` the instance of `slot` (under the lock).
+  static void Publish(CKRSingleton* created, Slot& slot);
+  // Takes the instance of `slot` out of the slot and the registry and
+  // releases it outside the lock; nothing when the slot is empty.
+  static void ReleaseSlot(Slot& slot);
+  // The destructor's part: empties `slot` when it still holds this.
+  void ClearSlot(Slot& slot) noexcept;
+
+private:
+  // Under the lock: out of the registry and out of its slot.
+  void Detach();
+
+  Slot* m_pSlot = nullptr;
 };
 
 template <class TClass, class TBase = CKRSingleton>
@@ -45,14 +67,14 @@ class KRCORELIB_API CKRSingletonT : public TBase {
 public:
   // The instance, created on first use.
   static TClass* GetInstance() {
-    CKRSingletonT* instance = m_pInstance.load(std::memory_order_acquire);
+    CKRSingleton* instance = m_pInstance.load(std::memory_order_acquire);
     if (instance != nullptr)
       return static_cast<TClass*>(instance);
     std::lock_guard<std::recursive_mutex> guard(CKRSingleton::GetLock());
     instance = m_pInstance.load(std::memory_order_relaxed);
     if (instance == nullptr) {
       TClass* created = new TClass();
-      m_pInstance.store(created, std::memory_order_release);
+      CKRSingleton::Publish(created, m_pInstance);
       return created;
     }
     return static_cast<TClass*>(instance);
@@ -62,23 +84,16 @@ public:
   static bool HasInstance() noexcept { return m_pInstance.load(std::memory_order_acquire) != nullptr; }
 
   // Releases the instance if it exists; a later GetInstance creates a new one.
-  static void ReleaseInstance() {
-    std::lock_guard<std::recursive_mutex> guard(CKRSingleton::GetLock());
-    if (CKRSingletonT* instance = m_pInstance.load(std::memory_order_relaxed))
-      instance->Release();
-  }
+  static void ReleaseInstance() { CKRSingleton::ReleaseSlot(m_pInstance); }
 
 protected:
   CKRSingletonT() = default;
-  ~CKRSingletonT() override {
-    // However the instance ends (ReleaseInstance, ReleaseAll or a derived
-    // Release), the next GetInstance must not see it. The instance is kept
-    // as this base so that no cast to TClass is needed here, where the
-    // TClass part has already been destroyed.
-    CKRSingletonT* self = this;
-    m_pInstance.compare_exchange_strong(self, nullptr, std::memory_order_acq_rel);
-  }
+  // However the instance ends (ReleaseInstance, ReleaseAll or a derived
+  // Release, or a plain delete), the next GetInstance must not see it.
+  ~CKRSingletonT() override { this->ClearSlot(m_pInstance); }
 
 private:
-  static inline std::atomic<CKRSingletonT*> m_pInstance{nullptr};
+  // Kept as the base class, so that the base can empty it and no cast to
+  // TClass is needed where the TClass part has already been destroyed.
+  static inline CKRSingleton::Slot m_pInstance{nullptr};
 };
