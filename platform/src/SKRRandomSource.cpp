@@ -6,7 +6,8 @@
 #include <cstring>
 #include <ctime>
 #include <fcntl.h>
-#include <pthread.h>
+#include <new>
+#include <sys/mman.h>
 #include <sys/random.h>
 #include <unistd.h>
 
@@ -25,12 +26,49 @@ struct SKRGuidPool {
 // Zero-initialised per thread: an empty pool.
 thread_local SKRGuidPool t_Pool;
 
-// Advanced in the child of every fork; a pool filled in another generation
-// holds bytes that the parent may hand out too.
+// Advanced when a draw finds itself in a child process: a pool filled in
+// another generation holds bytes that the parent may hand out too.
 constinit std::atomic<unsigned> g_ForkGeneration{0};
 
-void OnForkChild() {
-  g_ForkGeneration.fetch_add(1, std::memory_order_relaxed);
+// One page that the kernel zeroes in every child however it was made (fork,
+// _Fork, clone without CLONE_VM), where no fork handler runs: a zero flag
+// tells the first draw in a child that the pools came from the parent.
+// Null where the kernel cannot wipe on fork (before Linux 4.14); the process
+// ID is compared then.
+struct SKRForkSentinel {
+  std::atomic<unsigned> m_Alive;
+};
+
+SKRForkSentinel* ForkSentinel() {
+  static SKRForkSentinel* const s_pSentinel = []() -> SKRForkSentinel* {
+    const long pageSize = sysconf(_SC_PAGESIZE);
+    const std::size_t size = pageSize > 0 ? std::size_t(pageSize) : 4096;
+    void* page = mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    if (page == MAP_FAILED)
+      return nullptr;
+    if (madvise(page, size, MADV_WIPEONFORK) != 0) {
+      munmap(page, size);
+      return nullptr;
+    }
+    auto* sentinel = new (page) SKRForkSentinel{};
+    sentinel->m_Alive.store(1, std::memory_order_relaxed);
+    return sentinel;
+  }();
+  return s_pSentinel;
+}
+
+// True (once per child) when this process is a child of the one that filled
+// the pools.
+bool EnteredChild() {
+  if (SKRForkSentinel* sentinel = ForkSentinel()) {
+    unsigned expected = 0;
+    return sentinel->m_Alive.load(std::memory_order_relaxed) == 0 &&
+           sentinel->m_Alive.compare_exchange_strong(expected, 1, std::memory_order_relaxed);
+  }
+  static std::atomic<pid_t> s_Pid{::getpid()};
+  const pid_t now = ::getpid();
+  pid_t before = s_Pid.load(std::memory_order_relaxed);
+  return before != now && s_Pid.compare_exchange_strong(before, now, std::memory_order_relaxed);
 }
 
 std::size_t FillFromKernel(unsigned char* buffer, std::size_t size) {
@@ -97,12 +135,10 @@ void SKRRandomSource::Fill(void* buffer, std::size_t size) noexcept {
 
 void SKRRandomSource::NewUuid(GUID& guid) noexcept {
   SKRGuidPool& pool = t_Pool;
+  if (EnteredChild())
+    g_ForkGeneration.fetch_add(1, std::memory_order_relaxed);
   const unsigned generation = g_ForkGeneration.load(std::memory_order_relaxed);
   if (pool.m_Available < sizeof(GUID) || pool.m_ForkGeneration != generation) {
-    // Registered before the first pool is filled, so no filled pool can
-    // cross a fork unnoticed.
-    static const bool s_ForkHandlerInstalled = (pthread_atfork(nullptr, nullptr, &OnForkChild) == 0);
-    (void)s_ForkHandlerInstalled;
     Fill(pool.m_Bytes, kPoolBytes);
     pool.m_Available = kPoolBytes;
     pool.m_ForkGeneration = g_ForkGeneration.load(std::memory_order_relaxed);

@@ -14,7 +14,7 @@ struct SKRRandomSource {
 
   // A version-4 (random) UUID. Bytes are drawn from the kernel in large
   // batches into a per-thread pool, so most calls make no system call; the
-  // pool is discarded in a forked child so that parent and child never hand
-  // out the same value.
+  // pool is discarded in a child process however it was made (fork, _Fork,
+  // clone), so that parent and child never hand out the same value.
   static void NewUuid(GUID& guid) noexcept;
 };

@@ -9,6 +9,8 @@
 #include <random>
 #include <set>
 #include <string>
+#include <csignal>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
@@ -204,32 +206,45 @@ TEST(CKRGuid, NewValuesAreVersion4AndDistinctAcrossThreads) {
   EXPECT_EQ(all.size(), std::size_t(kThreads * kPerThread));
 }
 
+// However the child is made (fork runs the fork handlers, _Fork and a raw
+// clone run none), it never hands out what the parent hands out next.
 TEST(CKRGuid, ForkedChildNeverRepeatsTheParent) {
-  // Fill this thread's pool, then fork: the child must not hand out what the
-  // parent hands out next.
-  CKRGuid::CreateNewGUID();
-  int pipeEnds[2];
-  ASSERT_EQ(pipe(pipeEnds), 0);
-  const pid_t child = fork();
-  ASSERT_GE(child, 0);
-  if (child == 0) {
-    GUID made[64];
-    for (GUID& raw : made)
-      raw = CKRGuid::CreateNewGUID().GetGUID();
-    _exit(write(pipeEnds[1], made, sizeof made) == sizeof made ? 0 : 1);
+  struct Case {
+    const char* how;
+    pid_t (*spawn)();
+  };
+  const Case cases[] = {
+      {"fork", [] { return fork(); }},
+      {"_Fork", [] { return _Fork(); }},
+      {"clone", [] { return pid_t(syscall(SYS_clone, SIGCHLD, nullptr, nullptr, nullptr, nullptr)); }},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.how);
+    // Fill this thread's pool, then make the child.
+    CKRGuid::CreateNewGUID();
+    int pipeEnds[2];
+    ASSERT_EQ(pipe(pipeEnds), 0);
+    const pid_t child = c.spawn();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+      GUID made[64];
+      for (GUID& raw : made)
+        raw = CKRGuid::CreateNewGUID().GetGUID();
+      _exit(write(pipeEnds[1], made, sizeof made) == sizeof made ? 0 : 1);
+    }
+    close(pipeEnds[1]);
+    std::set<CKRGuid> parent;
+    for (int i = 0; i < 64; ++i)
+      parent.insert(CKRGuid::CreateNewGUID());
+    int fromChild = 0;
+    for (GUID raw; read(pipeEnds[0], &raw, sizeof raw) == sizeof raw; ++fromChild)
+      EXPECT_EQ(parent.count(CKRGuid(raw)), 0u);
+    close(pipeEnds[0]);
+    int status = 0;
+    waitpid(child, &status, 0);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0);
+    EXPECT_EQ(fromChild, 64);
   }
-  close(pipeEnds[1]);
-  std::set<CKRGuid> parent;
-  for (int i = 0; i < 64; ++i)
-    parent.insert(CKRGuid::CreateNewGUID());
-  int fromChild = 0;
-  for (GUID raw; read(pipeEnds[0], &raw, sizeof raw) == sizeof raw; ++fromChild)
-    EXPECT_EQ(parent.count(CKRGuid(raw)), 0u);
-  close(pipeEnds[0]);
-  int status = 0;
-  waitpid(child, &status, 0);
-  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0);
-  EXPECT_EQ(fromChild, 64);
 }
 
 TEST(CKRGuid, NarrowAndWideConversions) {
