@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <cwchar>
 #include <climits>
+#include <optional>
 #include <cwctype>
 #include <wctype.h>
 
@@ -20,7 +21,9 @@ wchar_t AsciiLower(wchar_t c) { return (c >= L'A' && c <= L'Z') ? wchar_t(c + 32
 // "%s"/"%c" without a length become "%ls"/"%lc", "%S"/"%C" and "%hs"/"%hc"
 // become narrow "%s"/"%c", "%ws" becomes "%ls", "%I64"/"%I32"/"%I" become
 // "ll"/""/"z". Everything else is copied unchanged.
-std::wstring TranslateFormat(const wchar_t* format) {
+// `narrowText` tells whether a conversion takes narrow text.
+std::wstring TranslateFormat(const wchar_t* format, bool& narrowText) {
+  narrowText = false;
   std::wstring out;
   const std::size_t n = std::wcslen(format);
   out.reserve(n + 8);
@@ -83,11 +86,13 @@ std::wstring TranslateFormat(const wchar_t* format) {
     case L'c':
       out += narrow ? L"" : L"l";
       out += conversion;
+      narrowText = narrowText || narrow;
       break;
     case L'S':
     case L'C':
       out += wide ? L"l" : L"";
       out += wchar_t(conversion == L'S' ? L's' : L'c');
+      narrowText = narrowText || !wide;
       break;
     default:
       out += length;
@@ -269,7 +274,12 @@ void CKRString::FormatV(const wchar_t* format, std::va_list arguments) {
   m_Text.clear();
   if (format == nullptr)
     return;
-  const std::wstring translated = TranslateFormat(format);
+  bool narrowText = false;
+  const std::wstring translated = TranslateFormat(format, narrowText);
+  // Narrow arguments are UTF-8 whatever the locale.
+  std::optional<SKRUtf8TextScope> utf8;
+  if (narrowText)
+    utf8.emplace();
 
   // Most texts are short: one attempt into a stack buffer. vswprintf cannot
   // tell "too small" from an encoding error, so a failure falls back to a

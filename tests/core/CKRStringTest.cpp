@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <climits>
+#include <clocale>
 #include <cstdint>
 #include <limits>
 #include <string>
@@ -130,6 +131,27 @@ TEST(CKRString, FormatDialect) {
   text.Format(L"%d-%s", 1, L"one");
   text.AppendFormat(L"+%hs", "two");
   EXPECT_EQ(text.str(), L"1-one+two");
+}
+
+// Narrow text is UTF-8 whatever the locale: in "C", as in a program that
+// never called setlocale, and in a German locale whose numbers stay German.
+TEST(CKRString, FormatReadsNarrowTextAsUtf8InEveryLocale) {
+  const std::string saved = std::setlocale(LC_ALL, nullptr);
+  for (const char* locale : {"C", "de_DE.UTF-8"}) {
+    if (std::setlocale(LC_ALL, locale) == nullptr) {
+      ADD_FAILURE() << "locale " << locale << " is missing (the set-up script generates it)";
+      continue;
+    }
+    SCOPED_TRACE(locale);
+    EXPECT_EQ(CKRString::Formatted(L"%hs|%S|%C", "\xC2\xB5m", "Gr\xC3\xBC\xC3\x9F\xE2\x82\xAC", 'x').str(),
+              L"\u00B5m|Gr\u00FC\u00DF\u20AC|x");
+    // Only the character type changes for the call.
+    const bool german = std::string(locale) != "C";
+    EXPECT_EQ(CKRString::Formatted(L"%.1f %hs", 1.5, "\xC3\xA4").str(), german ? L"1,5 \u00E4" : L"1.5 \u00E4");
+    // Ill-formed narrow text ends the output there.
+    EXPECT_EQ(CKRString::Formatted(L"a%hsb", "\xFF").str().substr(0, 1), L"a");
+  }
+  std::setlocale(LC_ALL, saved.c_str());
 }
 
 TEST(CKRString, FormatProducesLongOutputCompletely) {

@@ -87,8 +87,10 @@ public:
   int Replace(const wchar_t* from, const wchar_t* to);
   CKRString& Trim();
 
-  // printf-style formatting in the dialect described above. A format that
-  // the C library rejects leaves what it produced before the error.
+  // printf-style formatting in the dialect described above. Narrow text
+  // arguments are UTF-8 whatever the locale (also in a program that never
+  // called setlocale). A format that the C library rejects, or narrow text
+  // that is not UTF-8, leaves what was produced before the error.
   void Format(const wchar_t* format, ...);
   void FormatV(const wchar_t* format, std::va_list arguments);
   void AppendFormat(const wchar_t* format, ...);
