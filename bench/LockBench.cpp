@@ -20,13 +20,12 @@
 
 #include <benchmark/benchmark.h>
 
-#include <algorithm>
-#include <iomanip>
-#include <map>
+#include "KRBenchReport.h"
+
 #include <ostream>
 #include <shared_mutex>
 #include <string>
-#include <vector>
+#include <utility>
 
 namespace {
 
@@ -106,94 +105,31 @@ BENCHMARK_TEMPLATE(BM_Mix1PercentWriters, SStdShared)->Threads(1)->Threads(2)->U
 
 namespace {
 
-// The console reporter, which also keeps each benchmark's median real time
-// (nanoseconds) and prints the ratios against the targets at the end.
-class RatioReporter : public benchmark::ConsoleReporter {
-public:
-  using ConsoleReporter::ConsoleReporter;
-
-  void ReportRuns(const std::vector<Run>& runs) override {
-    ConsoleReporter::ReportRuns(runs);
-    for (const Run& run : runs) {
-      if (run.error_occurred)
-        continue;
-      const std::string name = run.run_name.function_name + "/" + run.run_name.threads;
-      const double time = Nanoseconds(run, run.GetAdjustedRealTime());
-      if (run.run_type == Run::RT_Iteration)
-        m_Samples[name].push_back(time);
-      else if (run.aggregate_name == "median")
-        m_Medians[name] = time;
-    }
-  }
-
-  void Finalize() override {
-    ConsoleReporter::Finalize();
-    std::ostream& out = GetOutputStream();
-    out << "\nRatios (median real time per pair and thread)\n" << std::fixed;
+class CKRLockReporter : public CKRBenchReporter {
+protected:
+  void Summarize(std::ostream& out) override {
+    const auto pair = [&](const char* test, const char* lock, const char* threads) {
+      const std::string name = std::string(test) + "<" + lock + ">/real_time/threads:" + threads;
+      const std::string peer = std::string(test) + "<SStdShared>/real_time/threads:" + threads;
+      return std::pair{name, peer};
+    };
     out << "\n1. Reader pair, one thread (target <= 2x std::shared_mutex)\n";
-    Ratio(out, "BM_Read<SNonReentrance>/threads:1", "BM_Read<SStdShared>/threads:1", 2.0);
-    Ratio(out, "BM_Read<SReentrant>/threads:1", "BM_Read<SStdShared>/threads:1", 2.0);
+    for (const char* lock : {"SNonReentrance", "SReentrant"}) {
+      const auto [name, peer] = pair("BM_Read", lock, "1");
+      Ratio(out, name, name, peer, 2.0);
+    }
     out << "\n2. Reader pair, two contending threads (target <= 1x std::shared_mutex, 10% noise allowed)\n";
-    Ratio(out, "BM_Read<SNonReentrance>/threads:2", "BM_Read<SStdShared>/threads:2", 1.1);
-    Ratio(out, "BM_Read<SReentrant>/threads:2", "BM_Read<SStdShared>/threads:2", 1.1);
+    for (const char* lock : {"SNonReentrance", "SReentrant"}) {
+      const auto [name, peer] = pair("BM_Read", lock, "2");
+      Ratio(out, name, name, peer, 1.1);
+    }
     out << "\n3. 1% writers (no target)\n";
-    for (const char* threads : {"/threads:1", "/threads:2"}) {
-      Ratio(out, std::string("BM_Mix1PercentWriters<SNonReentrance>") + threads,
-            std::string("BM_Mix1PercentWriters<SStdShared>") + threads, 0.0);
-      Ratio(out, std::string("BM_Mix1PercentWriters<SReentrant>") + threads,
-            std::string("BM_Mix1PercentWriters<SStdShared>") + threads, 0.0);
-    }
-    out.flush();
+    for (const char* threads : {"1", "2"})
+      for (const char* lock : {"SNonReentrance", "SReentrant"}) {
+        const auto [name, peer] = pair("BM_Mix1PercentWriters", lock, threads);
+        Ratio(out, name, name, peer, 0.0);
+      }
   }
-
-private:
-  static double Nanoseconds(const Run& run, double value) {
-    switch (run.time_unit) {
-      case benchmark::kSecond:
-        return value * 1e9;
-      case benchmark::kMillisecond:
-        return value * 1e6;
-      case benchmark::kMicrosecond:
-        return value * 1e3;
-      case benchmark::kNanosecond:
-        break;
-    }
-    return value;
-  }
-
-  // The median aggregate when repetitions were reported, otherwise the
-  // median of the runs.
-  bool Find(const std::string& name, double& time) const {
-    if (const auto median = m_Medians.find(name); median != m_Medians.end()) {
-      time = median->second;
-      return true;
-    }
-    const auto samples = m_Samples.find(name);
-    if (samples == m_Samples.end() || samples->second.empty())
-      return false;
-    std::vector<double> sorted = samples->second;
-    std::sort(sorted.begin(), sorted.end());
-    time = sorted[sorted.size() / 2];
-    return true;
-  }
-
-  // Prints mine against the reference; a positive `target` is the largest
-  // ratio that meets it.
-  void Ratio(std::ostream& out, const std::string& mine, const std::string& reference, double target) const {
-    double mineTime = 0.0;
-    double referenceTime = 0.0;
-    if (!Find(mine, mineTime) || !Find(reference, referenceTime))
-      return;
-    const double ratio = mineTime / referenceTime;
-    out << "   " << std::left << std::setw(44) << mine << std::right << std::setprecision(2) << std::setw(8)
-        << mineTime << " ns vs " << std::setw(8) << referenceTime << " ns   ratio " << ratio << "x";
-    if (target > 0.0)
-      out << "   target <= " << target << "x: " << (ratio <= target ? "met" : "MISSED");
-    out << "\n";
-  }
-
-  std::map<std::string, std::vector<double>> m_Samples;
-  std::map<std::string, double> m_Medians;
 };
 
 }  // namespace
@@ -202,7 +138,7 @@ int main(int argc, char** argv) {
   benchmark::Initialize(&argc, argv);
   if (benchmark::ReportUnrecognizedArguments(argc, argv))
     return 1;
-  RatioReporter reporter;
+  CKRLockReporter reporter;
   benchmark::RunSpecifiedBenchmarks(&reporter);
   benchmark::Shutdown();
   return 0;

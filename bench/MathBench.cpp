@@ -29,9 +29,9 @@
 #include <Eigen/Geometry>
 #include <benchmark/benchmark.h>
 
+#include "KRBenchReport.h"
+
 #include <cmath>
-#include <iomanip>
-#include <map>
 #include <ostream>
 #include <random>
 #include <string>
@@ -214,55 +214,22 @@ KR_MATH_BENCHMARKS(Affine)
 
 // ---- reporting --------------------------------------------------------------------
 
-// The console reporter, which also keeps each benchmark's CPU time per
-// element (the median when repetitions are aggregated; CPU time, because
-// other work on a shared machine inflates real time) and prints the ratios
-// against the targets at the end.
-class CKRRatioReporter : public benchmark::ConsoleReporter {
+// CPU time per element, because other work on a shared machine inflates
+// real time.
+class CKRMathReporter : public CKRBenchReporter {
 public:
-  void ReportRuns(const std::vector<Run>& runs) override {
-    ConsoleReporter::ReportRuns(runs);
-    for (const Run& run : runs) {
-      if (run.error_occurred)
-        continue;
-      const std::string name = run.run_name.function_name;
-      const double nanoseconds = run.GetAdjustedCPUTime() *
-                                 (1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit)) / kCount;
-      if (run.run_type == Run::RT_Iteration && m_MedianSeen.count(name) == 0)
-        m_Times[name] = nanoseconds;
-      else if (run.run_type == Run::RT_Aggregate && run.aggregate_name == "median") {
-        m_Times[name] = nanoseconds;
-        m_MedianSeen[name] = true;
-      }
-    }
-  }
+  CKRMathReporter() : CKRBenchReporter(ETime::Cpu, kCount) {}
 
-  void Finalize() override {
-    ConsoleReporter::Finalize();
-    std::ostream& out = GetOutputStream();
-    out << "\nRatios of krCoreLib's CPU time per element (target: at most 1.20x Eigen)\n\n";
-    out << "   operation          krCoreLib ns   Plain ns   Eigen ns   vs Plain   vs Eigen\n";
-    out << std::fixed;
+protected:
+  void Summarize(std::ostream& out) override {
+    out << "\nCPU time per element: krCoreLib / Plain and krCoreLib / Eigen (target <= 1.2x Eigen)\n";
     for (const char* precision : {"float", "double"})
       for (const char* operation : {"Add", "Dot", "Cross", "Normalize", "Affine"}) {
         const std::string key = std::string(precision) + "/" + operation + "/";
-        const auto ours = m_Times.find(key + "krCoreLib");
-        const auto plain = m_Times.find(key + "Plain");
-        const auto eigen = m_Times.find(key + "Eigen");
-        if (ours == m_Times.end() || plain == m_Times.end() || eigen == m_Times.end())
-          continue;
-        const double versusEigen = ours->second / eigen->second;
-        out << "   " << std::left << std::setw(18) << (std::string(precision) + " " + operation) << std::right
-            << std::setprecision(3) << std::setw(12) << ours->second << std::setw(11) << plain->second
-            << std::setw(11) << eigen->second << std::setprecision(2) << std::setw(10)
-            << ours->second / plain->second << "x" << std::setw(10) << versusEigen << "x   "
-            << (versusEigen <= 1.2 ? "met" : "MISSED") << "\n";
+        Ratio(out, key + "krCoreLib / Plain", key + "krCoreLib", key + "Plain", 0.0);
+        Ratio(out, key + "krCoreLib / Eigen", key + "krCoreLib", key + "Eigen", 1.2);
       }
   }
-
-private:
-  std::map<std::string, double> m_Times;
-  std::map<std::string, bool> m_MedianSeen;
 };
 
 }  // namespace
@@ -271,7 +238,7 @@ int main(int argc, char** argv) {
   benchmark::Initialize(&argc, argv);
   if (benchmark::ReportUnrecognizedArguments(argc, argv))
     return 1;
-  CKRRatioReporter reporter;
+  CKRMathReporter reporter;
   benchmark::RunSpecifiedBenchmarks(&reporter);
   benchmark::Shutdown();
   return 0;

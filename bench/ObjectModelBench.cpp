@@ -23,6 +23,12 @@
 //      that) rather than the 100 of a linear search. Paired with find in a
 //      plain std::map<CKRGuid, IKRObject*> of the same IDs and memory layout
 //      (ratio near 1: the tracking adds nothing to the tree search itself).
+//   7. CKRObjPtrList: Add, Contains and Remove of N = 1,000 .. 1,000,000
+//      objects, in insertion order and in random order, paired with a
+//      std::unordered_set of the same pointers. Target: the cost per element
+//      flat (in order: at most 2x its value at N = 1,000, where a linear scan
+//      would grow 1,000x; at random, where cache misses grow for any
+//      container, the ratio to the hash set within 2x across N).
 //
 // Run: bench_objectmodel --benchmark_repetitions=3
 //      --benchmark_report_aggregates_only=true
@@ -37,15 +43,19 @@
 #include <cstddef>
 #include <cstdlib>
 #include <iomanip>
+#include <malloc.h>
 #include <map>
 #include <new>
 #include <ostream>
 #include <random>
 #include <string>
+#include <type_traits>
 #include <unistd.h>
+#include <unordered_set>
 #include <vector>
 
 #include "KRAllocationCounter.h"
+#include "KRBenchReport.h"
 
 // ---- a tiny framework class ----------------------------------------------------
 
@@ -329,6 +339,65 @@ void RunGetInstance(benchmark::State& state, LookupMode mode) {
     state.SkipWithError("instances were left tracked");
 }
 
+// ---- 7. object lists ----------------------------------------------------------------
+
+// Fills a container with N objects, asks for each and removes each, in
+// insertion order (range(1) == 0: a document filling and emptying its lists)
+// or in random order (1). The list is paired with a std::unordered_set of
+// the same pointers in the same orders: random access to a million elements
+// costs cache and TLB misses whatever the container, so flatness is judged
+// per element in order, and relative to the hash set at random.
+template <class TContainer>
+void RunListCycle(benchmark::State& state) {
+  auto* type = CKRBenchObject::GetCKRBenchObjectType();
+  const auto count = static_cast<std::size_t>(state.range(0));
+  std::vector<IKRObject*> objects;
+  objects.reserve(count);
+  for (std::size_t i = 0; i < count; ++i)
+    objects.push_back(type->CreateInstance(CKRGuid()));
+  std::vector<IKRObject*> lookups = objects;
+  std::vector<IKRObject*> removal = objects;
+  if (state.range(1) != 0) {
+    std::mt19937_64 random(0x5eed);
+    std::shuffle(lookups.begin(), lookups.end(), random);
+    std::shuffle(removal.begin(), removal.end(), random);
+  }
+  std::size_t done = 0;
+  const auto cycle = [&] {
+    TContainer container;
+    if constexpr (std::is_same_v<TContainer, CKRObjPtrList<IKRObject>>) {
+      for (IKRObject* object : objects)
+        done += std::size_t(container.Add(object));
+      for (IKRObject* object : lookups)
+        done += container.Contains(object) ? 1 : 0;
+      for (IKRObject* object : removal)
+        done += container.Remove(object) != nullptr ? 1 : 0;
+    } else {
+      for (IKRObject* object : objects)
+        done += container.insert(object).second ? 1 : 0;
+      for (IKRObject* object : lookups)
+        done += container.count(object);
+      for (IKRObject* object : removal)
+        done += container.erase(object);
+    }
+  };
+  // One untimed cycle first: creating the objects left the caches full of
+  // the type's tracking map, and a million elements run few timed cycles.
+  cycle();
+  done = 0;
+  for (auto _ : state)
+    cycle();
+  state.SetItemsProcessed(state.iterations() * std::int64_t(count));
+  state.counters["elements"] = double(count);
+  for (IKRObject* object : objects)
+    object->Release();
+  if (done != 3 * count * std::size_t(state.iterations()))
+    state.SkipWithError("the container lost or refused an element");
+}
+
+void BM_ObjPtrList(benchmark::State& state) { RunListCycle<CKRObjPtrList<IKRObject>>(state); }
+void BM_UnorderedSet(benchmark::State& state) { RunListCycle<std::unordered_set<IKRObject*>>(state); }
+
 void BM_GetInstance_Random(benchmark::State& state) { RunGetInstance(state, LookupMode::Random); }
 void BM_GetInstance_HotSet(benchmark::State& state) { RunGetInstance(state, LookupMode::HotSet); }
 void BM_StdMapFind_Random(benchmark::State& state) { RunGetInstance(state, LookupMode::StdMap); }
@@ -351,46 +420,20 @@ BENCHMARK(BM_CreateReleaseInstance);
 BENCHMARK(BM_GetInstance_Random)->RangeMultiplier(10)->Range(1000, 100000)->Complexity(benchmark::oLogN);
 BENCHMARK(BM_GetInstance_HotSet)->RangeMultiplier(10)->Range(1000, 100000)->Complexity(benchmark::oLogN);
 BENCHMARK(BM_StdMapFind_Random)->RangeMultiplier(10)->Range(1000, 100000)->Complexity(benchmark::oLogN);
+BENCHMARK(BM_ObjPtrList)->ArgsProduct({{1000, 10000, 100000, 1000000}, {0, 1}})->ArgNames({"N", "random"})->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_UnorderedSet)->ArgsProduct({{1000, 10000, 100000, 1000000}, {0, 1}})->ArgNames({"N", "random"})->Unit(benchmark::kMillisecond);
 
 // ---- reporting -----------------------------------------------------------------
 
 namespace {
 
-// The console reporter, which also keeps each benchmark's median real time
-// (nanoseconds) and counters and prints the ratios against the targets at
-// the end.
-class RatioReporter : public benchmark::ConsoleReporter {
-public:
-  using ConsoleReporter::ConsoleReporter;
-
-  void ReportRuns(const std::vector<Run>& runs) override {
-    ConsoleReporter::ReportRuns(runs);
-    for (const Run& run : runs) {
-      if (run.error_occurred)
-        continue;
-      const std::string name = Key(run);
-      if (run.run_type == Run::RT_Iteration) {
-        Samples& samples = m_Samples[name];
-        samples.m_Times.push_back(Nanoseconds(run, run.GetAdjustedRealTime()));
-        samples.m_Counters.push_back(run.counters);
-      } else if (run.aggregate_name == "median") {
-        m_Medians[name] = {Nanoseconds(run, run.GetAdjustedRealTime()), run.counters};
-      } else if (run.aggregate_name == "RMS") {
-        m_RMS[run.run_name.function_name] = run.GetAdjustedRealTime();
-      }
-    }
-  }
-
-  void Finalize() override {
-    ConsoleReporter::Finalize();
-    std::ostream& out = GetOutputStream();
-    out << "\nRatios (median real times)\n";
-    out << std::fixed;
-
+class CKRObjectModelReporter : public CKRBenchReporter {
+protected:
+  void Summarize(std::ostream& out) override {
     out << "\n1. Copy and compare: time and allocations per iteration\n";
     for (const char* name : {"BM_CKRGuid_Copy", "BM_uuid_copy", "BM_CKRGuid_Equal", "BM_uuid_compare_Equal",
                              "BM_CKRGuid_Less", "BM_uuid_compare_Less"}) {
-      Result result;
+      SKRResult result;
       if (!Find(name, result))
         continue;
       const double allocations = Counter(result, "allocs/iter");
@@ -400,141 +443,87 @@ public:
         out << "   target <= 5 ns, 0 allocations: " << (result.m_Time <= 5.0 && allocations == 0.0 ? "met" : "MISSED");
       out << "\n";
     }
-    Ratio(out, "CKRGuid copy vs uuid_copy", "BM_CKRGuid_Copy", "BM_uuid_copy", 0.0);
-    Ratio(out, "CKRGuid == vs uuid_compare", "BM_CKRGuid_Equal", "BM_uuid_compare_Equal", 0.0);
-    Ratio(out, "CKRGuid < vs uuid_compare", "BM_CKRGuid_Less", "BM_uuid_compare_Less", 0.0);
+    Ratio(out, "CKRGuid copy / uuid_copy", "BM_CKRGuid_Copy", "BM_uuid_copy", 0.0);
+    Ratio(out, "CKRGuid == / uuid_compare", "BM_CKRGuid_Equal", "BM_uuid_compare_Equal", 0.0);
+    Ratio(out, "CKRGuid < / uuid_compare", "BM_CKRGuid_Less", "BM_uuid_compare_Less", 0.0);
 
-    out << "\n2.-4. Pairs against libuuid\n";
-    Ratio(out, "CreateNewGUID vs uuid_generate", "BM_CKRGuid_CreateNewGUID", "BM_uuid_generate", 20.0);
-    Ratio(out, "SetCString vs uuid_parse", "BM_CKRGuid_SetCString", "BM_uuid_parse", 5.0);
-    Result mine;
-    Result reference;
-    if (Find("BM_CKRGuid_GetCString", mine) && Find("BM_uuid_unparse_lower", reference)) {
-      const double ratio = mine.m_Time / reference.m_Time;
-      out << "   " << std::left << std::setw(40) << "GetCString vs uuid_unparse_lower" << std::right
-          << std::setprecision(2) << std::setw(9) << mine.m_Time << " ns vs " << std::setw(9) << reference.m_Time
-          << " ns   GetCString / unparse = " << ratio << "x   target <= 2x: " << (ratio <= 2.0 ? "met" : "MISSED")
-          << "\n";
-    }
+    out << "\n2.-4. Against libuuid\n";
+    Ratio(out, "CreateNewGUID / uuid_generate", "BM_CKRGuid_CreateNewGUID", "BM_uuid_generate", 1.0 / 20);
+    Ratio(out, "SetCString / uuid_parse", "BM_CKRGuid_SetCString", "BM_uuid_parse", 1.0 / 5);
+    Ratio(out, "GetCString / uuid_unparse_lower", "BM_CKRGuid_GetCString", "BM_uuid_unparse_lower", 2.0);
 
+    SKRResult result;
     out << "\n5. CreateInstance + ReleaseInstance\n";
-    if (Find("BM_CreateReleaseInstance", mine)) {
-      const double rate = Counter(mine, "items_per_second");
-      out << "   " << std::setprecision(2) << mine.m_Time << " ns a pair, " << std::setprecision(0) << rate
-          << " pairs/s, " << std::setprecision(2) << rate / 2e6 << "x the target of 2,000,000/s: "
-          << (rate >= 2e6 ? "met" : "MISSED") << "\n";
+    if (Find("BM_CreateReleaseInstance", result)) {
+      const double rate = Counter(result, "items_per_second");
+      out << "   " << std::setprecision(2) << result.m_Time << " ns a pair, " << std::setprecision(0) << rate
+          << " pairs/s, target >= 2,000,000/s: " << (rate >= 2e6 ? "met" : "MISSED") << "\n";
     }
 
     constexpr double kLogRatio = 5.0 / 3.0;
-    out << "\n6. GetInstance over N tracked instances (log ratio 100000:1000 is " << std::setprecision(2)
-        << kLogRatio << ", linear would be 100)\n";
-    for (const char* family : {"BM_GetInstance_Random", "BM_GetInstance_HotSet", "BM_StdMapFind_Random"}) {
-      Result small;
-      Result large;
-      const std::string base = family;
-      if (!Find(base + "/1000", small) || !Find(base + "/100000", large))
+    out << "\n6. GetInstance over N tracked instances (log ratio 100000:1000 is " << std::setprecision(2) << kLogRatio
+        << ", linear would be 100)\n";
+    for (const std::string family : {"BM_GetInstance_Random", "BM_GetInstance_HotSet", "BM_StdMapFind_Random"}) {
+      SKRResult small;
+      SKRResult large;
+      if (!Find(family + "/1000", small) || !Find(family + "/100000", large))
         continue;
-      for (const char* n : {"/1000", "/10000", "/100000"}) {
-        Result result;
-        if (Find(base + n, result))
-          out << "   " << std::left << std::setw(32) << base + n << std::right << std::setprecision(2)
-              << std::setw(9) << result.m_Time << " ns\n";
-      }
       const double ratio = large.m_Time / small.m_Time;
-      const auto rms = m_RMS.find(base);
       out << "   " << family << ": t(100000) / t(1000) = " << std::setprecision(2) << ratio;
-      if (rms != m_RMS.end())
-        out << ", O(log N) fit RMS " << std::setprecision(0) << rms->second * 100.0 << "%";
+      if (double rms = 0; FitError(family, rms))
+        out << ", O(log N) fit RMS " << std::setprecision(0) << rms * 100.0 << "%";
       out << "   logarithmic (ratio <= " << std::setprecision(2) << 2 * kLogRatio
           << "): " << (ratio <= 2 * kLogRatio ? "met" : "MISSED") << "\n";
     }
-    for (const char* n : {"/1000", "/10000", "/100000"}) {
-      const std::string label = std::string("GetInstance vs std::map::find") + n;
-      Ratio(out, label.c_str(), std::string("BM_GetInstance_Random") + n, std::string("BM_StdMapFind_Random") + n, 0.0);
+    for (const char* n : {"/1000", "/10000", "/100000"})
+      Ratio(out, std::string("GetInstance / std::map::find") + n, std::string("BM_GetInstance_Random") + n,
+            std::string("BM_StdMapFind_Random") + n, 0.0);
+
+    out << "\n7. CKRObjPtrList: Add + Contains + Remove, ns per element (and / std::unordered_set)\n";
+    double inOrder[2] = {0, 0};    // first and largest, in order
+    double versusSet[2] = {0, 0};  // smallest and largest ratio, random order
+    for (const char* n : {"1000", "10000", "100000", "1000000"}) {
+      out << "   N = " << std::left << std::setw(9) << n << std::right;
+      for (const char* random : {"0", "1"}) {
+        const std::string args = std::string("/N:") + n + "/random:" + random;
+        SKRResult list;
+        SKRResult set;
+        if (!Find("BM_ObjPtrList" + args, list) || !Find("BM_UnorderedSet" + args, set))
+          continue;
+        const double perElement = list.m_Time / Counter(list, "elements");
+        const double ratio = list.m_Time / set.m_Time;
+        out << (random[0] == '0' ? "  in order " : "   random ") << std::setprecision(1) << std::setw(7) << perElement
+            << " ns (" << std::setprecision(2) << ratio << "x)";
+        if (random[0] == '0') {
+          inOrder[0] = inOrder[0] == 0 ? perElement : inOrder[0];
+          inOrder[1] = std::max(inOrder[1], perElement);
+        } else {
+          versusSet[0] = versusSet[0] == 0 ? ratio : std::min(versusSet[0], ratio);
+          versusSet[1] = std::max(versusSet[1], ratio);
+        }
+      }
+      out << "\n";
     }
-    out.flush();
-  }
-
-private:
-  struct Samples {
-    std::vector<double> m_Times;
-    std::vector<benchmark::UserCounters> m_Counters;
-  };
-  struct Result {
-    double m_Time = 0.0;
-    benchmark::UserCounters m_Counters;
-  };
-
-  static std::string Key(const Run& run) {
-    std::string key = run.run_name.function_name;
-    if (!run.run_name.args.empty())
-      key += "/" + run.run_name.args;
-    return key;
-  }
-
-  static double Nanoseconds(const Run& run, double value) {
-    switch (run.time_unit) {
-      case benchmark::kSecond:
-        return value * 1e9;
-      case benchmark::kMillisecond:
-        return value * 1e6;
-      case benchmark::kMicrosecond:
-        return value * 1e3;
-      case benchmark::kNanosecond:
-        break;
+    if (inOrder[0] > 0 && versusSet[0] > 0) {
+      const double growth = inOrder[1] / inOrder[0];
+      const double spread = versusSet[1] / versusSet[0];
+      out << "   in order: largest / first cost per element " << std::setprecision(2) << growth
+          << "   flat (<= 2; a linear scan would grow 1,000x): " << (growth <= 2.0 ? "met" : "MISSED") << "\n";
+      out << "   random: largest / smallest ratio to the hash set " << spread
+          << "   flat (<= 2): " << (spread <= 2.0 ? "met" : "MISSED") << "\n";
     }
-    return value;
   }
-
-  static double Counter(const Result& result, const char* name) {
-    const auto at = result.m_Counters.find(name);
-    return at == result.m_Counters.end() ? 0.0 : at->second.value;
-  }
-
-  // The median aggregate when repetitions were reported, otherwise the
-  // median of the runs.
-  bool Find(const std::string& name, Result& result) const {
-    if (const auto median = m_Medians.find(name); median != m_Medians.end()) {
-      result = median->second;
-      return true;
-    }
-    const auto samples = m_Samples.find(name);
-    if (samples == m_Samples.end() || samples->second.m_Times.empty())
-      return false;
-    std::vector<std::size_t> order(samples->second.m_Times.size());
-    for (std::size_t i = 0; i < order.size(); ++i)
-      order[i] = i;
-    std::sort(order.begin(), order.end(),
-              [&](std::size_t a, std::size_t b) { return samples->second.m_Times[a] < samples->second.m_Times[b]; });
-    const std::size_t middle = order[order.size() / 2];
-    result = {samples->second.m_Times[middle], samples->second.m_Counters[middle]};
-    return true;
-  }
-
-  // Prints reference / krCoreLib; a target of 0 prints the ratio only.
-  void Ratio(std::ostream& out, const char* label, const std::string& mineName, const std::string& referenceName,
-             double target) const {
-    Result mine;
-    Result reference;
-    if (!Find(mineName, mine) || !Find(referenceName, reference))
-      return;
-    const double ratio = reference.m_Time / mine.m_Time;
-    out << "   " << std::left << std::setw(40) << label << std::right << std::setprecision(2) << std::setw(9)
-        << mine.m_Time << " ns vs " << std::setw(9) << reference.m_Time << " ns   reference / krCoreLib = " << ratio
-        << "x";
-    if (target > 0.0)
-      out << "   target >= " << std::setprecision(0) << target << "x: " << (ratio >= target ? "met" : "MISSED");
-    out << "\n";
-  }
-
-  std::map<std::string, Samples> m_Samples;
-  std::map<std::string, Result> m_Medians;
-  std::map<std::string, double> m_RMS;
 };
 
 }  // namespace
 
 int main(int argc, char** argv) {
+  // The allocator keeps what it got: otherwise freeing a container of a
+  // million nodes in allocation order hands the pages back to the system
+  // and every iteration pays page faults for them again, which measures the
+  // allocator's trimming rather than the containers.
+  mallopt(M_TRIM_THRESHOLD, 1 << 30);
+  mallopt(M_MMAP_THRESHOLD, 1 << 30);
   // The benchmark's tiny class (and the library's own) are claimed into a
   // repository once, as a host does at start.
   CKRTypeSystem::Initialize(kBenchRepository);
@@ -542,7 +531,7 @@ int main(int argc, char** argv) {
   benchmark::Initialize(&argc, argv);
   if (benchmark::ReportUnrecognizedArguments(argc, argv))
     return 1;
-  RatioReporter reporter(isatty(STDOUT_FILENO) ? RatioReporter::OO_Color : RatioReporter::OO_None);
+  CKRObjectModelReporter reporter;
   benchmark::RunSpecifiedBenchmarks(&reporter);
   benchmark::Shutdown();
 

@@ -11,10 +11,13 @@
 #include <krCoreLib/units/KRUnitConversion.h>
 
 #include "KRAllocationCounter.h"
+#include "KRBenchReport.h"
 
 #include <benchmark/benchmark.h>
 #include <udunits2.h>
 
+#include <iterator>
+#include <string>
 
 namespace {
 
@@ -83,4 +86,32 @@ void BM_Udunits2(benchmark::State& state) {
 
 BENCHMARK(BM_ConvertUnitValue)->DenseRange(0, 3)->ArgName("pair");
 BENCHMARK(BM_Udunits2)->DenseRange(0, 3)->ArgName("pair");
-BENCHMARK_MAIN();
+
+namespace {
+
+class CKRUnitsReporter : public CKRBenchReporter {
+protected:
+  void Summarize(std::ostream& out) override {
+    out << "\nConvertUnitValue / udunits2 (target <= 0.1x, 0 allocations)\n";
+    for (int i = 0; i < int(std::size(kPairs)); ++i) {
+      const std::string arg = "/pair:" + std::to_string(i);
+      const CKRString label = CKRString::Formatted(L"%s -> %s", kPairs[i].m_pFrom, kPairs[i].m_pTo);
+      Ratio(out, label.ToUtf8(), "BM_ConvertUnitValue" + arg, "BM_Udunits2" + arg, 0.1);
+      if (SKRResult mine; Find("BM_ConvertUnitValue" + arg, mine))
+        out << "      allocations per conversion " << std::setprecision(3) << Counter(mine, "allocs/iter")
+            << (Counter(mine, "converts") == 0 ? ", refused (not the same quantity)" : "") << "\n";
+    }
+  }
+};
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  benchmark::Initialize(&argc, argv);
+  if (benchmark::ReportUnrecognizedArguments(argc, argv))
+    return 1;
+  CKRUnitsReporter reporter;
+  benchmark::RunSpecifiedBenchmarks(&reporter);
+  benchmark::Shutdown();
+  return 0;
+}

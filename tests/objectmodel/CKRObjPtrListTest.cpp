@@ -1,9 +1,14 @@
 #include <krCoreLib/objectmodel/CKRObjPtrList.h>
 
 #include "KRTestObjects.h"
+#include "KRTestSeed.h"
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <list>
+#include <random>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -39,11 +44,56 @@ TEST(CKRObjPtrList, AddFindAndRemove) {
   EXPECT_EQ(list.Remove(twin), nullptr);
   EXPECT_EQ(list.Find(a->GetInstanceID()), a);
   EXPECT_EQ(list.GetCount(), 1);
+  // A copy is a list of its own: removing from it leaves the original, and
+  // it still refuses what it holds.
+  CKRObjPtrList<CKRTestItem> copy = list;
+  EXPECT_EQ(copy.Add(a), 0);
+  EXPECT_EQ(copy.Remove(a), a);
+  EXPECT_TRUE(list.Contains(a) && !copy.Contains(a));
+  copy = list;
+  EXPECT_EQ(copy.Remove(a), a);
+  CKRObjPtrList<CKRTestItem> moved = std::move(list);
+  EXPECT_EQ(moved.Remove(a), a);
+  EXPECT_EQ(moved.GetCount(), 0);
   // The untyped view takes any object.
   CKRObjPtrList<IKRObject> any;
   EXPECT_EQ(static_cast<IKRCollection&>(any).Add(other), 1);
   for (IKRObject* object : std::vector<IKRObject*>{a, twin, absent, other})
     object->Release();
+}
+
+// Random additions and removals against a plain list: order, membership and
+// count agree throughout, also after the index has grown and emptied.
+TEST(CKRObjPtrList, RandomEditsKeepOrderAndMembership) {
+  const unsigned seed = KRTestSeed();
+  std::mt19937 random(seed);
+  Items pool;
+  for (int i = 0; i < 300; ++i)
+    pool.push_back(NewTestItem());
+  CKRObjPtrList<CKRTestItem> list;
+  std::list<CKRTestItem*> model;
+  for (int step = 0; step < 30000; ++step) {
+    CKRTestItem* item = pool[random() % pool.size()];
+    const bool listed = std::find(model.begin(), model.end(), item) != model.end();
+    // Mostly additions in the first half, mostly removals in the second.
+    const bool add = (random() % 100) < (step % 10000 < 5000 ? 70u : 30u);
+    if (add) {
+      ASSERT_EQ(list.Add(item), listed ? 0 : 1) << "step " << step;
+      if (!listed)
+        model.push_back(item);
+    } else {
+      ASSERT_EQ(list.Remove(item), listed ? item : nullptr) << "step " << step;
+      model.remove(item);
+    }
+    ASSERT_EQ(list.Contains(item), add);
+    if (step % 997 == 0) {
+      ASSERT_EQ(Items(list.begin(), list.end()), Items(model.begin(), model.end())) << "step " << step;
+      ASSERT_EQ(Walk(list.GetReverseIterator()), Items(model.rbegin(), model.rend()));
+    }
+  }
+  EXPECT_EQ(list.GetCount(), int(model.size()));
+  for (CKRTestItem* item : pool)
+    item->Release();
 }
 
 TEST(CKRObjPtrList, RemoveAllReleasesEachElementOnce) {

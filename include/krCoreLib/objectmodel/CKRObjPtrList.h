@@ -5,20 +5,63 @@
 // only RemoveAll(true) asks each element to Release() itself. `T` is
 // IKRObject or a class derived from it; through the IKRCollection view an
 // element of another class is refused. Not synchronised.
+//
+// Cost: Add, Contains and Remove of an element take constant time on
+// average. The elements sit in an array of nodes linked in list order, found
+// through an open-addressing hash index of node numbers: 16 bytes a node and
+// at most 8 an index slot, so a million elements stay within a processor's
+// last-level cache. Find by instance ID walks the list, since an element's
+// instance ID may change while it is listed. Removing an element leaves
+// iterators at other positions valid. At most 2^32 - 2 elements.
 #pragma once
 
 #include <krCoreLib/objectmodel/IKRCollection.h>
 
-#include <algorithm>
-#include <list>
+#include <cstddef>
+#include <cstdint>
+#include <iterator>
 #include <type_traits>
+#include <utility>
+#include <vector>
 
 template <class T>
 class CKRObjPtrList : public IKRCollection {
   static_assert(std::is_base_of_v<IKRObject, T>, "elements are framework objects");
-  using List = std::list<T*>;
+
+  using Index = std::uint32_t;
+  static constexpr Index kNone = ~Index(0);
+
+  // A listed element and its neighbours; a free node (null element) links
+  // the free nodes through m_Next.
+  struct SKRNode {
+    T* m_pElement = nullptr;
+    Index m_Prev = kNone;
+    Index m_Next = kNone;
+  };
 
 public:
+  // Nodes are numbered, not pointed to, so copies and moves are plain.
+  CKRObjPtrList() = default;
+  CKRObjPtrList(const CKRObjPtrList&) = default;
+  CKRObjPtrList(CKRObjPtrList&& other) noexcept
+      : m_Nodes(std::move(other.m_Nodes)), m_Slots(std::move(other.m_Slots)), m_First(other.m_First),
+        m_Last(other.m_Last), m_FreeNode(other.m_FreeNode), m_Count(other.m_Count) {
+    other.Clear();
+  }
+  CKRObjPtrList& operator=(const CKRObjPtrList&) = default;
+  CKRObjPtrList& operator=(CKRObjPtrList&& other) noexcept {
+    if (this != &other) {
+      m_Nodes = std::move(other.m_Nodes);
+      m_Slots = std::move(other.m_Slots);
+      m_First = other.m_First;
+      m_Last = other.m_Last;
+      m_FreeNode = other.m_FreeNode;
+      m_Count = other.m_Count;
+      other.Clear();
+    }
+    return *this;
+  }
+
   // First to last.
   class Iterator : public IKRIterator {
   public:
@@ -27,18 +70,20 @@ public:
     T* Next(int restart) override {
       if (restart)
         Reset(1);
-      if (m_pList == nullptr || m_Position == m_pList->m_List.end())
+      if (m_pList == nullptr || m_Position == kNone)
         return nullptr;
-      return *m_Position++;
+      const SKRNode& node = m_pList->m_Nodes[m_Position];
+      m_Position = node.m_Next;
+      return node.m_pElement;
     }
     void Reset(int reset) override {
       if (reset && m_pList != nullptr)
-        m_Position = m_pList->m_List.begin();
+        m_Position = m_pList->m_First;
     }
     bool IsValid() const override { return m_pList != nullptr; }
 
   private:
-    typename List::iterator m_Position{};
+    Index m_Position = kNone;
     CKRObjPtrList* m_pList = nullptr;
   };
 
@@ -50,28 +95,59 @@ public:
     T* Next(int restart) override {
       if (restart)
         Reset(1);
-      if (m_pList == nullptr || m_Position == m_pList->m_List.rend())
+      if (m_pList == nullptr || m_Position == kNone)
         return nullptr;
-      return *m_Position++;
+      const SKRNode& node = m_pList->m_Nodes[m_Position];
+      m_Position = node.m_Prev;
+      return node.m_pElement;
     }
     void Reset(int reset) override {
       if (reset && m_pList != nullptr)
-        m_Position = m_pList->m_List.rbegin();
+        m_Position = m_pList->m_Last;
     }
     bool IsValid() const override { return m_pList != nullptr; }
 
   private:
-    typename List::reverse_iterator m_Position{};
+    Index m_Position = kNone;
     CKRObjPtrList* m_pList = nullptr;
   };
 
-  int GetCount() const override { return static_cast<int>(m_List.size()); }
+  // Read-only walk for range-for loops and standard algorithms.
+  class ConstIterator {
+  public:
+    using iterator_category = std::forward_iterator_tag;
+    using value_type = T*;
+    using difference_type = std::ptrdiff_t;
+    using pointer = T* const*;
+    using reference = T* const&;
+
+    ConstIterator() = default;
+    reference operator*() const { return (*m_pNodes)[m_Position].m_pElement; }
+    ConstIterator& operator++() {
+      m_Position = (*m_pNodes)[m_Position].m_Next;
+      return *this;
+    }
+    ConstIterator operator++(int) {
+      ConstIterator before = *this;
+      ++*this;
+      return before;
+    }
+    bool operator==(const ConstIterator& other) const { return m_Position == other.m_Position; }
+
+  private:
+    friend class CKRObjPtrList;
+    ConstIterator(const std::vector<SKRNode>* nodes, Index position) : m_pNodes(nodes), m_Position(position) {}
+    const std::vector<SKRNode>* m_pNodes = nullptr;
+    Index m_Position = kNone;
+  };
+
+  int GetCount() const override { return static_cast<int>(m_Count); }
 
   // The first element, in list order, with that instance ID; null if none.
   T* Find(CKRGuid instanceID) override {
-    for (T* element : m_List)
-      if (element->GetInstanceID() == instanceID)
-        return element;
+    for (Index at = m_First; at != kNone; at = m_Nodes[at].m_Next)
+      if (m_Nodes[at].m_pElement->GetInstanceID() == instanceID)
+        return m_Nodes[at].m_pElement;
     return nullptr;
   }
 
@@ -79,57 +155,144 @@ public:
   // the first element and unlinks it (unless its Release already did),
   // until the list is empty; each element is released once.
   void RemoveAll(bool release) override {
-    if (!release) {
-      m_List.clear();
-      return;
+    if (release) {
+      while (m_First != kNone) {
+        T* first = m_Nodes[m_First].m_pElement;
+        // Taken before the release: only the pointer value is looked up
+        // after it, since the element may be gone.
+        const IKRObject* key = first;
+        first->Release();
+        if (const Index slot = FindSlot(key); slot != kNone)
+          Erase(slot);
+      }
     }
-    while (!m_List.empty()) {
-      T* first = m_List.front();
-      first->Release();
-      // Only the pointer value is compared: the element may be gone.
-      const auto at = std::find(m_List.begin(), m_List.end(), first);
-      if (at != m_List.end())
-        m_List.erase(at);
-    }
+    Clear();
   }
 
   // 0 for null, for an element that is not a T and for one already listed.
   int Add(IKRObject* element) override {
     T* typed = CastElement<T>(element);
-    if (typed == nullptr || Contains(typed))
+    if (typed == nullptr || Contains(typed) || m_Count >= kNone - 1)
       return 0;
-    m_List.push_back(typed);
+    if (2 * (std::size_t(m_Count) + 1) > m_Slots.size())
+      Rehash(m_Slots.empty() ? 8 : 2 * m_Slots.size());
+    Index at = m_FreeNode;
+    if (at != kNone) {
+      m_FreeNode = m_Nodes[at].m_Next;
+    } else {
+      at = Index(m_Nodes.size());
+      m_Nodes.emplace_back();
+    }
+    m_Nodes[at] = {typed, m_Last, kNone};
+    (m_Last != kNone ? m_Nodes[m_Last].m_Next : m_First) = at;
+    m_Last = at;
+    ++m_Count;
+    Place(at);
     return 1;
   }
 
   // Unlinks the element; null when it is not listed.
   T* Remove(IKRObject* element) override {
-    if (element == nullptr)
+    const Index slot = FindSlot(element);
+    if (slot == kNone)
       return nullptr;
-    const auto at = std::find_if(m_List.begin(), m_List.end(),
-                                 [&](T* listed) { return static_cast<IKRObject*>(listed) == element; });
-    if (at == m_List.end())
-      return nullptr;
-    T* removed = *at;
-    m_List.erase(at);
+    T* removed = m_Nodes[m_Slots[slot]].m_pElement;
+    Erase(slot);
     return removed;
   }
 
-  bool Contains(const IKRObject* element) const {
-    return element != nullptr &&
-           std::any_of(m_List.begin(), m_List.end(),
-                       [&](const T* listed) { return static_cast<const IKRObject*>(listed) == element; });
-  }
+  bool Contains(const IKRObject* element) const { return FindSlot(element) != kNone; }
 
   Iterator GetIterator() { return Iterator(this); }
   ReverseIterator GetReverseIterator() { return ReverseIterator(this); }
 
-  // Read-only walk for range-for loops.
-  typename List::const_iterator begin() const { return m_List.begin(); }
-  typename List::const_iterator end() const { return m_List.end(); }
+  ConstIterator begin() const { return ConstIterator(&m_Nodes, m_First); }
+  ConstIterator end() const { return ConstIterator(&m_Nodes, kNone); }
 
 private:
-  List m_List;
+  const IKRObject* KeyOf(Index node) const { return m_Nodes[node].m_pElement; }
+
+  // Objects of one 4 KiB page keep their order in neighbouring slots, so
+  // that a walk in allocation order touches the index as it touches memory;
+  // pages are scattered by Fibonacci hashing of the page number, so strided
+  // addresses do not pile up in one run of slots.
+  std::size_t Home(const IKRObject* key) const {
+    const auto address = std::uint64_t(reinterpret_cast<std::uintptr_t>(key));
+    const std::uint64_t page = ((address >> 12) * 0x9E3779B97F4A7C15ull) >> 32;
+    return std::size_t(page + ((address >> 4) & 0xFF)) & (m_Slots.size() - 1);
+  }
+
+  // The index slot holding `key`, or kNone.
+  Index FindSlot(const IKRObject* key) const {
+    if (key == nullptr || m_Count == 0)
+      return kNone;
+    const std::size_t mask = m_Slots.size() - 1;
+    for (std::size_t slot = Home(key);; slot = (slot + 1) & mask) {
+      const Index node = m_Slots[slot];
+      if (node == kNone)
+        return kNone;
+      if (KeyOf(node) == key)
+        return Index(slot);
+    }
+  }
+
+  // Enters node `at` into the index (linear probing; at most half full).
+  void Place(Index at) {
+    const std::size_t mask = m_Slots.size() - 1;
+    std::size_t slot = Home(KeyOf(at));
+    while (m_Slots[slot] != kNone)
+      slot = (slot + 1) & mask;
+    m_Slots[slot] = at;
+  }
+
+  void Rehash(std::size_t slots) {
+    m_Slots.assign(slots, kNone);
+    for (Index at = m_First; at != kNone; at = m_Nodes[at].m_Next)
+      Place(at);
+  }
+
+  // Unlinks the node in index slot `slot`, frees it and closes the gap in
+  // the probe sequence by shifting later entries back (no tombstones, so
+  // lookups never slow down after many removals).
+  void Erase(Index slot) {
+    const Index at = m_Slots[slot];
+    SKRNode& node = m_Nodes[at];
+    (node.m_Prev != kNone ? m_Nodes[node.m_Prev].m_Next : m_First) = node.m_Next;
+    (node.m_Next != kNone ? m_Nodes[node.m_Next].m_Prev : m_Last) = node.m_Prev;
+    node = {nullptr, kNone, m_FreeNode};
+    m_FreeNode = at;
+    --m_Count;
+
+    const std::size_t mask = m_Slots.size() - 1;
+    std::size_t hole = slot;
+    for (std::size_t next = (hole + 1) & mask; m_Slots[next] != kNone; next = (next + 1) & mask) {
+      const std::size_t home = Home(KeyOf(m_Slots[next]));
+      // The entry at `next` may move into the hole unless its home lies
+      // cyclically in (hole, next].
+      const bool staysPut = hole <= next ? (hole < home && home <= next) : (hole < home || home <= next);
+      if (!staysPut) {
+        m_Slots[hole] = m_Slots[next];
+        hole = next;
+      }
+    }
+    m_Slots[hole] = kNone;
+  }
+
+  void Clear() noexcept {
+    m_Nodes.clear();
+    m_Nodes.shrink_to_fit();
+    m_Slots.clear();
+    m_Slots.shrink_to_fit();
+    m_First = m_Last = m_FreeNode = kNone;
+    m_Count = 0;
+  }
+
+  std::vector<SKRNode> m_Nodes;
+  std::vector<Index> m_Slots;  // node numbers; kNone is empty; a power of two
+  Index m_First = kNone;
+  Index m_Last = kNone;
+  Index m_FreeNode = kNone;
+  Index m_Count = 0;
 };
 
 extern template class KRCORELIB_API CKRObjPtrList<IKRObject>;
