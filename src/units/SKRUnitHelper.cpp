@@ -169,10 +169,11 @@ CKRString SKRUnitHelper::GetUnitSet(int unitClass) {
     return CKRString();
   SKRUnitClass& entry = at->second;
   if (entry.m_UnitSet.IsEmpty()) {
-    for (const _SKRUnit& unit : entry.m_Units) {
-      if (!entry.m_UnitSet.IsEmpty())
+    // A separator between every two keys, empty keys included.
+    for (std::size_t i = 0; i < entry.m_Units.size(); ++i) {
+      if (i > 0)
         entry.m_UnitSet += L',';
-      entry.m_UnitSet += unit.Unit;
+      entry.m_UnitSet += entry.m_Units[i].Unit;
     }
   }
   return entry.m_UnitSet;

@@ -81,4 +81,9 @@ TEST(SKRUnitHelper, AddUnitReplacesOnlyTheDefaultsOfAKnownKey) {
   EXPECT_EQ(helper.GetUnitClass(L"cm"), -1);
   EXPECT_EQ(copy.GetUnitCount(0), 6);  // copies are independent
   EXPECT_EQ(helper.AddUnit(0, L"m", L"m", L"meters", 2), 1);
+  // An empty first key keeps its separator.
+  helper.ClearUnits(1);
+  helper.AddUnit(1, L"", L"", L"none", 0);
+  helper.AddUnit(1, L"x", L"x", L"ex", 0);
+  EXPECT_EQ(helper.GetUnitSet(1), L",x");
 }
