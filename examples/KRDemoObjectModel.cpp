@@ -75,6 +75,9 @@ void KRDemoObjectModel() {
 
   Print(L"\n6. Releasing: one circle by hand, the rest by the type system.\n");
   found->Release();
+  Print(L"   Expected next: two warnings. The demo leaves three objects to their types on\n"
+        L"   purpose; releasing the repository releases them and reports them on the\n"
+        L"   developers' debug output, which the demo switches on here.\n");
   // Instances a type still holds at shutdown are released by the type and
   // reported on the developers' debug output, shown here.
   CKRDebugOutput::SetHandler(&CKRDebugOutput::StandardError);

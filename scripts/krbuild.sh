@@ -13,9 +13,12 @@ set -euo pipefail
 mode=${1:-test}
 root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 
-# Everything the build, the tests and the benchmarks need.
-packages=(g++ cmake ninja-build pkg-config uuid-dev libgtest-dev libgmock-dev libbenchmark-dev
-  libeigen3-dev libudunits2-dev locales)
+# What the library and the demo need; the tests and the benchmarks (built
+# with the tests, run by hand) need the rest.
+packages=(g++ cmake ninja-build pkg-config)
+if [[ $mode != demo ]]; then
+  packages+=(libgtest-dev libgmock-dev locales libbenchmark-dev uuid-dev libeigen3-dev libudunits2-dev)
+fi
 
 missing=()
 for package in "${packages[@]}"; do
@@ -30,22 +33,28 @@ fi
 
 # A German locale (decimal comma) lets the tests show that text forms do not
 # depend on the process locale.
-if ! locale -a 2>/dev/null | grep -qix 'de_DE.utf8'; then
+if [[ $mode != demo ]] && ! locale -a 2>/dev/null | grep -qix 'de_DE.utf8'; then
   echo "krbuild: generating the de_DE.UTF-8 locale for the tests"
   localedef -i de_DE -f UTF-8 de_DE.UTF-8
 fi
 
-configure_and_build() {
+configure() {
   local dir=$1
   shift
   cmake -S "$root" -B "$dir" -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo "$@" >/dev/null
-  cmake --build "$dir"
+}
+
+configure_and_build() {
+  configure "$@"
+  cmake --build "$1"
 }
 
 case "$mode" in
 demo)
+  # Only the library and the demo are built.
   dir=${BUILD_DIR:-$root/build}
-  configure_and_build "$dir"
+  configure "$dir"
+  cmake --build "$dir" --target krdemo
   "$dir/examples/krdemo"
   ;;
 test)
