@@ -133,12 +133,14 @@ struct SKRLockHolds {
   std::vector<SKRLockHold> m_Overflow;
 };
 
-// The calling thread's record. Every lock operation needs it, so the
-// pointer to it uses the initial-exec model (one instruction to reach, and
-// only 8 bytes of the static TLS block); the record itself is created on
-// first use and freed when the thread ends.
-__attribute__((tls_model("initial-exec"))) thread_local SKRLockHolds* t_pHolds = nullptr;
-__attribute__((tls_model("initial-exec"))) thread_local bool t_HoldsFreed = false;
+// The calling thread's record, created on first use and freed when the
+// thread ends. Every lock operation needs it; the library is built with TLS
+// descriptors, which reach it nearly as fast as the initial-exec model
+// would, without making the library impossible to load with dlopen (a
+// module with initial-exec variables needs its whole thread-local block in
+// the small static TLS reserve).
+thread_local SKRLockHolds* t_pHolds = nullptr;
+thread_local bool t_HoldsFreed = false;
 
 [[gnu::noinline]] SKRLockHolds& CreateHolds() {
   if (t_HoldsFreed) {
