@@ -21,6 +21,28 @@
 #include <krCoreLib/objectmodel/IKRObjectType.h>
 #include <krCoreLib/objectmodel/KRObjectTypeMacros.h>
 
+// Serialization: fields, storable objects, archives and documents.
+#include <krCoreLib/serialization/CKRArchive.h>
+#include <krCoreLib/serialization/CKRBOOL.h>
+#include <krCoreLib/serialization/CKRDocument.h>
+#include <krCoreLib/serialization/CKRFieldAdaptor.h>
+#include <krCoreLib/serialization/CKRFieldDataAction.h>
+#include <krCoreLib/serialization/CKRFieldDataAdaptor.h>
+#include <krCoreLib/serialization/CKRFieldStream.h>
+#include <krCoreLib/serialization/CKRFieldT.h>
+#include <krCoreLib/serialization/CKRGroupFieldData.h>
+#include <krCoreLib/serialization/CKRObjCollectionFieldT.h>
+#include <krCoreLib/serialization/CKRObjFieldT.h>
+#include <krCoreLib/serialization/CKRSerialObject.h>
+#include <krCoreLib/serialization/CKRSerialObjectTypeImpl.h>
+#include <krCoreLib/serialization/CKRTypeManifest.h>
+#include <krCoreLib/serialization/IKRField.h>
+#include <krCoreLib/serialization/IKRFieldData.h>
+#include <krCoreLib/serialization/IKRFieldStream.h>
+#include <krCoreLib/serialization/IKRSerializable.h>
+#include <krCoreLib/serialization/IKRSerializableAdaptor.h>
+#include <krCoreLib/serialization/KRFieldTypes.h>
+
 // Units and engineering values.
 #include <krCoreLib/units/CKRColor.h>
 #include <krCoreLib/units/CKROptionSet.h>

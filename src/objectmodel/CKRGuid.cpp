@@ -290,6 +290,10 @@ void CKRGuid::SetCString(const CKRString& text) noexcept {
   ParseBraced(text.GetString(), text.size());
 }
 
+bool CKRGuid::ReadCString(const CKRString& text) noexcept {
+  return ParseBraced(text.GetString(), text.size());
+}
+
 void CKRGuid::SetBString(BSTR text) noexcept {
   const std::wstring_view view = ViewOf(text);
   ParseBraced(view.data(), view.size());

@@ -4,6 +4,8 @@
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/objectmodel/IKRObject.h>
 
+#include <algorithm>
+
 namespace {
 
 // Deeper than any real class hierarchy; bounds the walk that keeps parent
@@ -84,9 +86,20 @@ int CKRObjectTypeImpl::HasDerivedTypes() {
 void CKRObjectTypeImpl::InitializeType() {}
 
 void CKRObjectTypeImpl::Release() {
-  if (const int count = m_InstanceMap.GetCount(); count > 0) {
+  if (const int count = GetInstanceCount(); count > 0) {
     CKRDebugOutput::Printf(L"Warning! %d instances of class %s were not released\n", count, m_Name.GetString());
-    m_InstanceMap.RemoveAll(true);
+    // In ascending ID order, each taken out before it is released (its
+    // Release may release others, which then are gone when their turn comes).
+    std::vector<CKRGuid> ids;
+    GetInstanceList(ids);
+    for (const CKRGuid& id : ids) {
+      const auto at = m_InstanceMap.find(id);
+      if (at == m_InstanceMap.end())
+        continue;
+      IKRObject* object = at->second;
+      m_InstanceMap.erase(at);
+      object->Release();
+    }
   }
   DetachChildTypes();
   if (m_pParentType != nullptr)
@@ -145,7 +158,8 @@ int CKRObjectTypeImpl::ReleaseInstance(IKRObject* object) {
 }
 
 IKRObject* CKRObjectTypeImpl::GetInstance(CKRGuid instanceID) {
-  return m_InstanceMap.Find(instanceID);
+  const auto at = m_InstanceMap.find(instanceID);
+  return at == m_InstanceMap.end() ? nullptr : at->second;
 }
 
 int CKRObjectTypeImpl::AddChildType(IKRObjectType* child) {
@@ -177,8 +191,10 @@ int CKRObjectTypeImpl::IsTypeOf(CKRGuid typeID) {
 }
 
 void CKRObjectTypeImpl::GetInstanceList(std::vector<CKRGuid>& list) {
+  const std::size_t first = list.size();
   for (const auto& [id, object] : m_InstanceMap)
     list.push_back(id);
+  std::sort(list.begin() + std::ptrdiff_t(first), list.end());
 }
 
 void CKRObjectTypeImpl::GetDerivedTypes(std::vector<IKRObjectType*>& list) {
@@ -192,9 +208,26 @@ void CKRObjectTypeImpl::GetDerivedTypes(std::vector<IKRObjectType*>& list) {
 void CKRObjectTypeImpl::RemoveTrackedInstance(IKRObject* object) {
   // Removes the entry only when it holds this very object: an untracked twin
   // with the same instance ID leaves the tracked object in place.
-  m_InstanceMap.Remove(object);
+  if (object == nullptr)
+    return;
+  const auto at = m_InstanceMap.find(object->GetInstanceID());
+  if (at != m_InstanceMap.end() && at->second == object)
+    m_InstanceMap.erase(at);
 }
 
 void CKRObjectTypeImpl::AddTrackedInstance(IKRObject* object) {
-  m_InstanceMap.Add(object);
+  if (object != nullptr)
+    m_InstanceMap.try_emplace(object->GetInstanceID(), object);
+}
+
+void SKRObjectIdentity::SetInstanceID(IKRObject* object, CKRGuid id) {
+  if (object == nullptr || object->GetInstanceID() == id)
+    return;
+  IKRObjectType* type = object->GetType();
+  const bool tracked = type != nullptr && type->GetInstance(object->GetInstanceID()) == object;
+  if (tracked)
+    type->RemoveTrackedInstance(object);
+  object->SetInstanceID(id);
+  if (tracked)
+    type->AddTrackedInstance(object);
 }

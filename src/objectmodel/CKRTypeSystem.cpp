@@ -11,22 +11,33 @@ CKRTypeSystem* CKRTypeSystem::m_pInstance = nullptr;
 
 namespace {
 
-// Types the type system re-registers on Initialize when a previous Release
-// dropped them: the roots that every other type derives from.
-std::vector<IKRObjectType*> BaseTypes() {
-  return {CKRObjectImpl::GetCKRObjectImplType()};
+// The process-wide lists of living type objects, created on first use and
+// never destroyed: type objects of modules unloaded at exit still remove
+// themselves from them after other function-local statics are gone.
+struct SKRLivingTypes {
+  // The roots that every other type derives from (CKRObjectImpl's type and
+  // those a subsystem adds with AddBaseType): Initialize registers them
+  // when they are missing.
+  std::vector<IKRObjectType*> m_BaseTypes;
+  // Type objects that live on after the type system let go of them:
+  // released with their repository or dropped by Release while their module
+  // stays loaded (the library's own types, or a plug-in the loader keeps
+  // mapped). The next Initialize registers them again, so that a module
+  // claimed again finds its types.
+  std::vector<IKRObjectType*> m_Dormant;
+};
+
+SKRLivingTypes& LivingTypes() {
+  static auto* s_pTypes = new SKRLivingTypes{{CKRObjectImpl::GetCKRObjectImplType()}, {}};
+  return *s_pTypes;
 }
 
-// Type objects that live on after the type system let go of them: released
-// with their repository or dropped by Release while their module stays
-// loaded (the library's own types, or a plug-in the loader keeps mapped).
-// The next Initialize registers them again, so that a module claimed again
-// finds its types. A type object that is destroyed leaves the list. Never
-// destroyed itself: type objects of modules unloaded at exit still remove
-// themselves from it after other function-local statics are gone.
 std::vector<IKRObjectType*>& DormantTypes() {
-  static auto* s_pTypes = new std::vector<IKRObjectType*>();
-  return *s_pTypes;
+  return LivingTypes().m_Dormant;
+}
+
+void EraseType(std::vector<IKRObjectType*>& types, IKRObjectType* type) {
+  types.erase(std::remove(types.begin(), types.end(), type), types.end());
 }
 
 // Removes the entry under `id` when it holds `type`.
@@ -69,6 +80,12 @@ void CKRTypeSystem::Release() {
   GetInstance()->_Release();
 }
 
+void CKRTypeSystem::AddBaseType(IKRObjectType* type) {
+  std::vector<IKRObjectType*>& bases = LivingTypes().m_BaseTypes;
+  if (type != nullptr && std::find(bases.begin(), bases.end(), type) == bases.end())
+    bases.push_back(type);
+}
+
 CKRTypeIterator CKRTypeSystem::GetGlobalIterator() {
   return GetInstance()->_GetGlobalIterator();
 }
@@ -103,7 +120,7 @@ CKRTypeIterator CKRTypeSystem::_GetRepositoryIterator(CKRGuid repositoryID) {
 }
 
 void CKRTypeSystem::_Initialize(CKRGuid repositoryID) {
-  for (IKRObjectType* base : BaseTypes())
+  for (IKRObjectType* base : LivingTypes().m_BaseTypes)
     if (_FindType(base->GetID()) == nullptr)
       _AddType(base);
   // In the order they were let go; a type whose ID has been taken since by
@@ -206,8 +223,8 @@ void CKRTypeSystem::_Release() {
 void CKRTypeSystem::RemoveDestroyedType(IKRObjectType* type) {
   if (type == nullptr)
     return;
-  std::vector<IKRObjectType*>& dormant = DormantTypes();
-  dormant.erase(std::remove(dormant.begin(), dormant.end(), type), dormant.end());
+  EraseType(LivingTypes().m_BaseTypes, type);
+  EraseType(DormantTypes(), type);
   CKRTypeSystem* system = m_pInstance;
   if (system == nullptr)
     return;

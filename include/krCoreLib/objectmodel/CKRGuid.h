@@ -144,6 +144,9 @@ public:
   void SetSTLString(const std::wstring& text) noexcept;
   void SetCString(const CKRString& text) noexcept;
   void SetBString(BSTR text) noexcept;
+  // SetCString that tells: true when the text was read, false when it was
+  // refused (the value unchanged).
+  bool ReadCString(const CKRString& text) noexcept;
   // XML form: a text longer than 10 characters whose first 5 characters are
   // dropped and whose remaining 36 are the canonical text.
   void SetSTLStringXML(const std::wstring& text) noexcept;

@@ -26,7 +26,6 @@
 
 template <class T>
 class CKRObjPtrList : public IKRCollection {
-  static_assert(std::is_base_of_v<IKRObject, T>, "elements are framework objects");
 
   using Index = std::uint32_t;
   static constexpr Index kNone = ~Index(0);
@@ -171,6 +170,8 @@ public:
 
   // 0 for null, for an element that is not a T and for one already listed.
   int Add(IKRObject* element) override {
+    // Checked here, not at class scope: a class may hold a list of itself.
+    static_assert(std::is_base_of_v<IKRObject, T>, "elements are framework objects");
     T* typed = CastElement<T>(element);
     if (typed == nullptr || Contains(typed) || m_Count >= kNone - 1)
       return 0;

@@ -1,6 +1,7 @@
 // CKRObjectTypeImpl: the default implementation of IKRObjectType, from which
 // every type class derives (directly or through the nested-type pattern of
-// KRObjectTypeMacros.h).
+// KRObjectTypeMacros.h). Finding, adding and removing a tracked instance
+// take constant time on average.
 //
 // A derived type supplies CTOR (allocate one instance, or null for an
 // abstract class) and DTOR (destroy an instance made by CTOR). The type
@@ -16,6 +17,7 @@
 #include <krCoreLib/objectmodel/IKRObjectType.h>
 
 #include <map>
+#include <unordered_map>
 
 class KRCORELIB_API CKRObjectTypeImpl : public IKRObjectType {
 public:
@@ -47,7 +49,7 @@ public:
   virtual void SetClassName(CKRString name);
 
   // Number of tracked instances.
-  int GetInstanceCount() const { return m_InstanceMap.GetCount(); }
+  int GetInstanceCount() const { return static_cast<int>(m_InstanceMap.size()); }
 
 protected:
   CKRObjectTypeImpl() = default;
@@ -75,7 +77,21 @@ private:
   CKRGuid m_ParentTypeID;
   CKRString m_Name;
   CKRString m_ClassName;
-  CKRObjGuidPtrMap<IKRObject> m_InstanceMap;
+  // Tracked instances by instance ID: hashed, since a type may track a
+  // great many (a document's field streams); the operations that list or
+  // release them go in ascending ID order all the same.
+  std::unordered_map<CKRGuid, IKRObject*> m_InstanceMap;
   IKRObjectType* m_pParentType = nullptr;
   std::map<CKRGuid, IKRObjectType*> m_ChildTypeMap;
+};
+
+// The sanctioned way to give an existing object another instance ID: a
+// storable type naming a new instance, a store applying the stored ID to an
+// object, a manifest or stream re-keyed to what it stores. An object its
+// type tracks is removed under its old ID and added again under the new
+// one, so that GetInstance finds it by the new ID (if another tracked object
+// holds that ID already, this one stays untracked, as an untracked twin of
+// CreateInstance). Null objects are ignored. Not synchronised.
+struct KRCORELIB_API SKRObjectIdentity {
+  static void SetInstanceID(IKRObject* object, CKRGuid id);
 };

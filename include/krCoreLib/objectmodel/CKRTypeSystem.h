@@ -43,6 +43,11 @@ public:
   // then the type system itself; a later call starts a new, empty one, in
   // which the living types are found again after the next Initialize.
   static void Release();
+  // Makes `type` a root type that Initialize registers whenever no type
+  // with its ID is registered (as it does for CKRObjectImpl's type): a
+  // subsystem calls it for the roots of its classes while it loads. Null
+  // and repeated calls are ignored; a destroyed type leaves the list.
+  static void AddBaseType(IKRObjectType* type);
   static CKRTypeIterator GetGlobalIterator();
   // An unbound iterator for an unknown repository.
   static CKRTypeIterator GetRepositoryIterator(CKRGuid repositoryID);

@@ -48,6 +48,8 @@ public:
 protected:
   ~IKRObject() = default;
 
-  // The type sets the instance ID of the objects it creates.
+  // The type sets the instance ID of the objects it creates; stores and
+  // storable types give objects their stored IDs through SKRObjectIdentity.
   friend class CKRObjectTypeImpl;
+  friend struct SKRObjectIdentity;
 };

@@ -34,21 +34,26 @@
 // exported inline constant would become a process-wide unique symbol, and the
 // dynamic loader never unmaps a module that defines one, so a plug-in could
 // not be unloaded.
-#define KR_DECLARE_OBJECT_TYPE(Class, TypeBase, TypeIDText)                 \
-public:                                                                     \
-  KRCORELIB_LOCAL static constexpr CKRGuid TypeID = CKRGuid::Literal(TypeIDText);  \
-  class Class##Type : public TypeBase {                                     \
-  public:                                                                   \
-    Class##Type();                                                          \
-                                                                            \
-  protected:                                                                \
-    IKRObject* CTOR() override;                                             \
-    void DTOR(IKRObject* object) override;                                  \
-  };                                                                        \
-  static Class##Type* Get##Class##Type();                                   \
-  IKRObjectType* GetType() override;                                        \
-  int Release() override;                                                   \
-                                                                            \
+#define KR_DECLARE_OBJECT_TYPE(Class, TypeBase, TypeIDText) KR_DECLARE_OBJECT_TYPE_WITH_(Class, TypeBase, TypeIDText, )
+
+// The declaration with further members of the nested type (`TypeMembers`,
+// public), for type families such as storable classes.
+#define KR_DECLARE_OBJECT_TYPE_WITH_(Class, TypeBase, TypeIDText, TypeMembers)  \
+public:                                                                         \
+  KRCORELIB_LOCAL static constexpr CKRGuid TypeID = CKRGuid::Literal(TypeIDText); \
+  class Class##Type : public TypeBase {                                         \
+  public:                                                                       \
+    Class##Type();                                                              \
+    TypeMembers                                                                 \
+                                                                                \
+  protected:                                                                    \
+    IKRObject* CTOR() override;                                                 \
+    void DTOR(IKRObject* object) override;                                      \
+  };                                                                            \
+  static Class##Type* Get##Class##Type();                                       \
+  IKRObjectType* GetType() override;                                            \
+  int Release() override;                                                       \
+                                                                                \
 private:
 
 // Shared part of the two implementation macros.
