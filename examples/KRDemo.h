@@ -17,6 +17,7 @@ inline void PrintSection(const wchar_t* title) {
 }
 
 void KRDemoObjectModel();
+void KRDemoSerialization();
 void KRDemoUnits();
 void KRDemoMath();
 void KRDemoFiles();

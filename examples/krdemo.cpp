@@ -6,6 +6,8 @@ int main() {
   Print(L"krCoreLib demo\n");
   PrintSection(L"Object model");
   KRDemoObjectModel();
+  PrintSection(L"Fields and storable objects");
+  KRDemoSerialization();
   PrintSection(L"Units and engineering values");
   KRDemoUnits();
   PrintSection(L"Math in two precisions");

@@ -1,5 +1,7 @@
 #include "KRMemoryStore.h"
 
+#include <algorithm>
+
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/serialization/IKRField.h>
 #include <krCoreLib/serialization/IKRFieldData.h>
@@ -26,10 +28,12 @@ CKRBOOL CKRMemoryArchive::Open(AccessMode mode) {
     CKRDocument* document = CreateNewDocument(documentID, nullptr);
     if (document == nullptr)
       return false;
+    // Manifests by type, streams in ascending ID order within each.
     std::map<CKRGuid, std::vector<CKRGuid>> byType;
     for (const auto& [instanceID, object] : stored.m_Objects)
       byType[object.m_TypeID].push_back(instanceID);
-    for (const auto& [typeID, instances] : byType) {
+    for (auto& [typeID, instances] : byType) {
+      std::sort(instances.begin(), instances.end());
       CKRTypeManifest* manifest = document->CreateTypeManifest(typeID, nullptr);
       if (manifest == nullptr)
         return false;
@@ -71,14 +75,16 @@ int CKRMemoryTypeManifest::WriteTypeHeader(IKRObjectType* type) {
 }
 
 SKRStoredObject* CKRMemoryFieldStream::Stored(bool create) {
+  if (m_pStored != nullptr)
+    return m_pStored;
   auto* document = dynamic_cast<CKRMemoryDocument*>(GetDocument());
   SKRStoredDocument* stored = document != nullptr ? document->Stored() : nullptr;
   if (stored == nullptr)
     return nullptr;
   if (create)
-    return &stored->m_Objects[GetStoredInstanceID()];
+    return m_pStored = &stored->m_Objects[GetStoredInstanceID()];
   const auto at = stored->m_Objects.find(GetStoredInstanceID());
-  return at == stored->m_Objects.end() ? nullptr : &at->second;
+  return at == stored->m_Objects.end() ? nullptr : (m_pStored = &at->second);
 }
 
 int CKRMemoryFieldStream::WriteObjectHeader(IKRObject* object) {

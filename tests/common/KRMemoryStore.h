@@ -7,6 +7,7 @@
 #include <krCoreLib/serialization/CKRArchive.h>
 
 #include <map>
+#include <unordered_map>
 #include <vector>
 
 struct SKRStoredLink {
@@ -24,8 +25,8 @@ struct SKRStoredObject {
 };
 
 struct SKRStoredDocument {
-  std::map<CKRGuid, int> m_TypeHeaders;          // type ID -> header writes
-  std::map<CKRGuid, SKRStoredObject> m_Objects;  // by instance ID
+  std::map<CKRGuid, int> m_TypeHeaders;                    // type ID -> header writes
+  std::unordered_map<CKRGuid, SKRStoredObject> m_Objects;  // by instance ID
 };
 
 struct SKRStoredMedium {
@@ -101,4 +102,6 @@ private:
   // (reading) when nothing is stored for it.
   SKRStoredObject* Stored(bool create);
   std::vector<SKRStoredLink>* StoredLinks(IKRFieldData* fieldData);
+
+  SKRStoredObject* m_pStored = nullptr;  // found once (elements of the medium do not move)
 };
