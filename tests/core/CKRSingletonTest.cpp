@@ -51,7 +51,7 @@ protected:
 };
 
 // 'U' creates 'D' in its constructor and looks at it in its destructor; 'L'
-// creates 'C' while it is released.
+// creates 'C' while it is released; 'J' waits for a thread that asks for 'B'.
 template <char Name, class TBase = CKRSingleton>
 class CNamed : public CKRSingletonT<CNamed<Name, TBase>, TBase> {
   friend class CKRSingletonT<CNamed<Name, TBase>, TBase>;
@@ -68,6 +68,8 @@ protected:
       Events().push_back(CNamed<'D'>::HasInstance() ? "D alive" : "D gone");
     if constexpr (Name == 'L')
       CNamed<'C'>::GetInstance();
+    if constexpr (Name == 'J')
+      std::thread([] { CNamed<'B'>::GetInstance(); }).join();
   }
 };
 
@@ -81,15 +83,8 @@ void CReplacingBase::Release() {
   CNamed<'P'>::GetInstance();
 }
 
-// Its destructor waits for a thread that asks for another singleton.
-class CJoiner : public CKRSingletonT<CJoiner> {
-  friend class CKRSingletonT<CJoiner>;
-  ~CJoiner() override {
-    std::thread([] { CB::GetInstance(); }).join();
-  }
-};
-
-// Reports its release on standard error, for tests that end the process.
+// Reports its release on standard error, for tests that end the process
+// (after the event list is gone).
 class CExitReporter : public CKRSingletonT<CExitReporter> {
   friend class CKRSingletonT<CExitReporter>;
   ~CExitReporter() override { std::fputs("released at exit\n", stderr); }
@@ -185,7 +180,7 @@ TEST(CKRSingleton, ReleaseAllIsSafeAsTheLastCallAtExit) {
   EXPECT_EXIT(
       {
         alarm(20);  // a deadlock ends the child with SIGALRM
-        CJoiner::GetInstance();
+        CNamed<'J'>::GetInstance();
         CKRSingleton::ReleaseAll();
         std::exit(CKRSingleton::GetCount() == 0 && !CB::HasInstance() ? 0 : 1);
       },

@@ -10,11 +10,6 @@
 
 namespace {
 
-constexpr CKRGuid kRootID = CKRGuid::Literal("{10000000-0000-4000-8000-000000000000}");
-constexpr CKRGuid kChildID = CKRGuid::Literal("{20000000-0000-4000-8000-000000000000}");
-constexpr CKRGuid kOtherChildID = CKRGuid::Literal("{25000000-0000-4000-8000-000000000000}");
-constexpr CKRGuid kGrandchildID = CKRGuid::Literal("{30000000-0000-4000-8000-000000000000}");
-
 void Collect(const wchar_t* text, void* context) {
   static_cast<std::vector<std::wstring>*>(context)->push_back(text);
 }
@@ -95,7 +90,7 @@ TEST(CKRObjectTypeImpl, ParentLinksDecideIsTypeOf) {
   CKRLocalType root(L"Root", kRootID);
   CKRLocalType child(L"Child", kChildID, kRootID);
   CKRLocalType otherChild(L"OtherChild", kOtherChildID, kRootID);
-  CKRLocalType grandchild(L"Grandchild", kGrandchildID, kChildID);
+  CKRLocalType grandchild(L"Grandchild", kLeafID, kChildID);
   EXPECT_EQ(child.IsTypeOf(CKRGuid()), 0);
   EXPECT_EQ(child.IsTypeOf(kRootID), 0);  // not linked yet
   EXPECT_EQ(child.RegisterWithParentType(nullptr), 0);

@@ -13,11 +13,6 @@ namespace {
 
 constexpr CKRGuid kHostRepository = CKRGuid::Literal("{AAAAAAAA-0000-4000-8000-000000000001}");
 constexpr CKRGuid kPluginRepository = CKRGuid::Literal("{BBBBBBBB-0000-4000-8000-000000000002}");
-// Ascending IDs from root to leaf, so that plain ID order would release the
-// root first.
-constexpr CKRGuid kRootID = CKRGuid::Literal("{10000000-0000-4000-8000-000000000000}");
-constexpr CKRGuid kChildID = CKRGuid::Literal("{20000000-0000-4000-8000-000000000000}");
-constexpr CKRGuid kLeafID = CKRGuid::Literal("{30000000-0000-4000-8000-000000000000}");
 
 using Log = std::vector<std::wstring>;
 using Types = std::vector<IKRObjectType*>;

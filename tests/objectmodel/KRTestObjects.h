@@ -43,6 +43,13 @@ public:
   virtual void Draw() = 0;
 };
 
+// IDs of the local type hierarchies, ascending from root to leaf, so that
+// plain ID order would release a root first.
+constexpr CKRGuid kRootID = CKRGuid::Literal("{10000000-0000-4000-8000-000000000000}");
+constexpr CKRGuid kChildID = CKRGuid::Literal("{20000000-0000-4000-8000-000000000000}");
+constexpr CKRGuid kOtherChildID = CKRGuid::Literal("{25000000-0000-4000-8000-000000000000}");
+constexpr CKRGuid kLeafID = CKRGuid::Literal("{30000000-0000-4000-8000-000000000000}");
+
 // A tracked CKRTestItem made by its type.
 CKRTestItem* NewTestItem(CKRGuid id = CKRGuid());
 
