@@ -45,10 +45,12 @@ public:
   virtual CKRTypeManifest* CreateTypeManifest(CKRGuid typeID, IKRObjectType* manifestType);
   // 1 when absent; otherwise the manifest's Release result.
   virtual int DeleteTypeManifest(CKRGuid typeID);
-  virtual int DeleteAllTypeManifests();
   // A new session: every object may be written (and read) once more.
   virtual void AdvanceSerialSessionID();
   virtual CKRGuid GetSerialSessionID();
+  // Releases every manifest in ascending type-ID order: 1, or 0 when one
+  // refused (it stays).
+  virtual int DeleteAllTypeManifests();
 
 protected:
   CKRDocument() = default;
