@@ -270,12 +270,12 @@ struct CKRSingleAppInstanceListener::SKRState {
     bool ready[kMaxClients + 1];
     SKRClock::time_point acceptAgain = SKRClock::now();
     for (;;) {
-      const auto now = SKRClock::now();
       // The listener is left out while the clients are at their limit, or
       // for a moment after accepting failed.
-      const bool accepting = m_Clients.size() < kMaxClients && now >= acceptAgain;
+      const bool pausing = SKRClock::now() < acceptAgain;
+      const bool accepting = m_Clients.size() < kMaxClients && !pausing;
       fds[0] = accepting ? m_hListener : -1;
-      SKRClock::time_point wakeUp = accepting ? SKRClock::time_point::max() : acceptAgain;
+      SKRClock::time_point wakeUp = pausing ? acceptAgain : SKRClock::time_point::max();
       for (std::size_t i = 0; i < m_Clients.size(); ++i) {
         fds[i + 1] = m_Clients[i].m_hSocket;
         wakeUp = std::min(wakeUp, m_Clients[i].m_Deadline);
@@ -293,14 +293,16 @@ struct CKRSingleAppInstanceListener::SKRState {
         break;
       }
       // Clients first (their flags follow the current list), then new ones.
+      // A client is let go when it is done, misbehaves or has said nothing
+      // whole in time (a line dribbled out byte by byte included).
       std::size_t kept = 0;
       for (std::size_t i = 0; i < m_Clients.size(); ++i) {
         SKRClient& client = m_Clients[i];
-        const bool keep = ready[i + 1] ? Serve(client) : SKRClock::now() < client.m_Deadline;
-        if (keep)
-          m_Clients[kept++] = std::move(client);
-        else
+        const bool keep = (!ready[i + 1] || Serve(client)) && SKRClock::now() < client.m_Deadline;
+        if (!keep)
           SKRInstanceChannel::Close(client.m_hSocket);
+        else if (kept++ != i)
+          m_Clients[kept - 1] = std::move(client);
       }
       m_Clients.resize(kept);
       if (accepting && ready[0])

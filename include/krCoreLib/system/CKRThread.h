@@ -177,11 +177,12 @@ public:
   // Ends a running thread at its next kill point (see above) and waits at
   // most the kill time-out for that; then the exit code is `exitCode` and
   // OnKill() is called. When the thread has not ended in time, throws type
-  // 3: the kill stays pending, and the thread ends with `exitCode` at the
-  // kill point it reaches next (without OnKill); a later Kill waits for that
-  // end again. Called from the thread itself it ends the thread at once, by
-  // unwinding from the call. Nothing for a thread that is not running.
-  // `flag` is not used.
+  // 3 ("The thread has not reached a kill point in time."): the kill stays
+  // pending, and the thread ends with `exitCode` at the kill point it
+  // reaches next; a later Kill waits for that end again (and calls OnKill
+  // when it sees it). Called from the thread itself it ends the thread at
+  // once, by unwinding from the call. Nothing for a thread that is not
+  // running. `flag` is not used.
   void Kill(unsigned long exitCode = 0xFFFFFFFF, int flag = 0);
   // How long Kill waits, in 100-ms steps; kKillTimeoutSteps (5 seconds)
   // at construction, KRTHREAD_INFINITE waits without limit.
