@@ -219,14 +219,7 @@ TEST(CKRMemMapFile, MemoryNotTheUsersOwnIsRefusedAndLeftAlone) {
   if (!KRCanActAsAnotherUser())
     GTEST_SKIP() << "needs root to act as a second user";
   const CKRString name = UniqueName(L"planted");
-  // The system's names of the block and its lock: whatever appears in the
-  // shared-memory folder while it is mapped.
-  std::vector<std::string> objects;
-  {
-    CKRMemMapFile probe;
-    ASSERT_EQ(probe.MapMemory(name.GetString(), 64), 1);
-    objects = KRSharedObjectsNamed(CKRMemMapFile::MakeMappingName(name.GetString()).ToUtf8());
-  }
+  const std::vector<std::string> objects = KRSharedObjectsOf(name);   // the block and its lock
   ASSERT_EQ(objects.size(), 2u);
   CKRMemMapFile victim;
   {

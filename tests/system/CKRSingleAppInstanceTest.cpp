@@ -1,7 +1,5 @@
 #include <krCoreLib/system/CKRSingleAppInstance.h>
 
-#include <krCoreLib/system/CKRMemMapFile.h>
-
 #include "KRFilesScratch.h"
 
 #include <condition_variable>
@@ -121,13 +119,13 @@ TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
   CKRSingleAppInstanceListener listener;
   ASSERT_TRUE(listener.Start(id.GetString(), nullptr, [&](const CKRString& file) { requests.Add(file); }));
 
-  std::vector<int> silent;
   const std::string socketPath = scratch.Native("run/krCoreLib-") + id.ToUtf8() + "-test.sock";
+  sockaddr_un address {};
+  address.sun_family = AF_UNIX;
+  ASSERT_LT(socketPath.size(), sizeof address.sun_path);
+  std::memcpy(address.sun_path, socketPath.c_str(), socketPath.size() + 1);
+  std::vector<int> silent;
   for (int i = 0; i < 4; ++i) {
-    sockaddr_un address {};
-    address.sun_family = AF_UNIX;
-    ASSERT_LT(socketPath.size(), sizeof address.sun_path);
-    std::memcpy(address.sun_path, socketPath.c_str(), socketPath.size() + 1);
     const int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
     ASSERT_EQ(::connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0) << socketPath;
     silent.push_back(fd);
@@ -164,6 +162,7 @@ TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
   for (const int fd : silent)
     ::close(fd);
 }
+
 TEST(CKRSingleAppInstance, TheLockEndsWithItsProcess) {
   CKRScratchRuntime scratch;
   // Separators and a length beyond a socket address: still one instance.
@@ -228,12 +227,7 @@ TEST(CKRSingleAppInstance, AHandOverThroughMemoryOfAnotherUserFails) {
     GTEST_SKIP() << "needs root to act as a second user";
   CKRScratchRuntime scratch;
   const CKRString id = UniqueID(L"planted");
-  std::vector<std::string> objects;
-  {
-    CKRMemMapFile probe;   // the system's names of the block and its lock
-    ASSERT_EQ(probe.MapMemory(id.GetString(), 8), 1);
-    objects = KRSharedObjectsNamed(CKRMemMapFile::MakeMappingName(id.GetString()).ToUtf8());
-  }
+  const std::vector<std::string> objects = KRSharedObjectsOf(id);   // the block and its lock
   ASSERT_EQ(objects.size(), 2u);
   CKRRequests requests;
   CKRSingleAppInstanceListener listener;

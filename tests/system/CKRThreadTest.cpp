@@ -116,17 +116,8 @@ TEST(CKRThread, StopEndsAReactingHandlerAndReportsOneThatDoesNotReact) {
 }
 
 TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
-  // Another member holds the group lock and the test thread the process
-  // lock throughout, so that taking either waits.
-  CGate groupHeld, holderMayEnd;
-  CFunctionThread holder([&](CFunctionThread& self) -> unsigned long {
-    self.Lock();
-    groupHeld.Open();
-    return holderMayEnd.Wait() ? 0 : 1;
-  });
-  holder.SetSynchronicity(1, L"kill points");
-  holder.Start();
-  ASSERT_TRUE(groupHeld.Wait());
+  // The test thread holds the process lock throughout, so that taking it
+  // waits (groups wait alike).
   CKRThread::OpenProcessLocking();
   CKRThread::ProcessLock();
 
@@ -136,7 +127,6 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
       // A timed wait, which a cancellation could not end under the address
       // sanitizer.
       {"timed command wait", [](CFunctionThread& self) { krtest::IgnoreCommands(self, 60000); }},
-      {"group lock", [](CFunctionThread& self) { self.Lock(); }},
       {"process lock", [](CFunctionThread&) { CKRThread::ProcessLock(); }},
       {"status wait", [](CFunctionThread& self) { self.WaitForActivityStatus(99, KRTHREAD_INFINITE); }},
       {"computing", [](CFunctionThread&) {
@@ -160,7 +150,6 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
       wait(self);
       return 1;
     });
-    thread.SetSynchronicity(1, L"kill points");
     thread.Kill(5);   // not running: nothing happens
     thread.Start();
     ASSERT_TRUE(atKillPoint.Wait());
@@ -173,8 +162,6 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
   }
   CKRThread::ProcessUnlock();
   CKRThread::CloseProcessLocking();
-  holderMayEnd.Open();
-  EXPECT_NE(Stopped(holder), kNotStopped);
 
   // A handler may kill its own thread: it ends at once.
   std::atomic<bool> after{false};

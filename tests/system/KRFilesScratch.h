@@ -4,6 +4,7 @@
 #pragma once
 
 #include <krCoreLib/core/CKRString.h>
+#include <krCoreLib/system/CKRMemMapFile.h>
 #include <krCoreLib/system/CKRSystem.h>
 
 #include "KRTestSeed.h"
@@ -176,14 +177,19 @@ inline bool KRBecomeAnotherUser() {
          ::setresuid(KRAnotherUser(), KRAnotherUser(), KRAnotherUser()) == 0;
 }
 
-// The names in the system's shared-memory folder that contain `part`.
-inline std::vector<std::string> KRSharedObjectsNamed(const std::string& part) {
-  std::vector<std::string> names;
+// The system's paths of the shared memory named `name` and of its lock:
+// what appears in the shared-memory folder while it is mapped.
+inline std::vector<std::string> KRSharedObjectsOf(const CKRString& name) {
+  std::vector<std::string> paths;
+  CKRMemMapFile probe;
+  if (probe.MapMemory(name.GetString(), 8) != 1)
+    return paths;
+  const std::string part = CKRMemMapFile::MakeMappingName(name.GetString()).ToUtf8();
   for (const auto& entry : std::filesystem::directory_iterator("/dev/shm")) {
     if (entry.path().filename().string().find(part) != std::string::npos)
-      names.push_back(entry.path().string());
+      paths.push_back(entry.path().string());
   }
-  return names;
+  return paths;
 }
 
 // Shared-memory objects that the second user plants under the given paths,
