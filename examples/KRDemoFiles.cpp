@@ -61,7 +61,8 @@ void KRDemoFiles() {
     if (map.MapFile(file.GetString(), false, 0, true) == 1) {
       auto* text = static_cast<char*>(map.Open(1000));
       Print(CKRString::Formatted(L"   mapped %u bytes as %s\n", map.GetSize(), map.GetName().GetString()));
-      std::memcpy(text, "SPAN", 4);  // written under the mapping's lock
+      if (text != nullptr)
+        std::memcpy(text, "SPAN", 4);  // written under the mapping's lock
       map.Close();
       map.UnMap();
     }
@@ -74,13 +75,17 @@ void KRDemoFiles() {
 
   Print(L"\n5. Named shared memory, seen by two mappings:\n");
   {
+    // Either mapping fails (0) when memory of that name belongs to another
+    // user of the machine, or others may use it.
     CKRMemMapFile writer, reader;
-    writer.MapMemory(L"krDemo\\Scratch", 32);
-    std::memcpy(writer.Open(), "hello across mappings", 22);
-    writer.Close();
-    reader.MapExistingMemory(L"krDemo\\Scratch", 32, true);
-    Print(CKRString::Formatted(L"   %s: \"%hs\"\n", reader.GetName().GetString(),
-                               static_cast<const char*>(reader.Open())));
+    if (writer.MapMemory(L"krDemo\\Scratch", 32) == 1 && reader.MapExistingMemory(L"krDemo\\Scratch", 32, true) == 1) {
+      std::memcpy(writer.Open(), "hello across mappings", 22);
+      writer.Close();
+      Print(CKRString::Formatted(L"   %s: \"%hs\"\n", reader.GetName().GetString(),
+                                 static_cast<const char*>(reader.Open())));
+    } else {
+      Print(L"   (the shared memory could not be mapped)\n");
+    }
   }
 
   Print(L"\n6. The folder listed and removed with everything in it:\n");

@@ -50,6 +50,25 @@ bool WriteFully(int fd, const unsigned char* data, std::size_t size) noexcept {
   return true;
 }
 
+// Whether the directory open as `fd` is the root of the whole tree (as this
+// process sees it) or of a mounted file system. Neither can be removed, and
+// below a mount point lies another file system: both are left alone. In
+// doubt (the parent cannot be looked at) the answer is yes.
+bool IsRootOrMountPoint(int fd) noexcept {
+  struct stat self {}, parent {};
+  if (::fstat(fd, &self) != 0 || ::fstatat(fd, "..", &parent, 0) != 0)
+    return true;
+  // The root is its own parent; a file system mounted elsewhere has a
+  // parent on another device.
+  if (self.st_dev != parent.st_dev || self.st_ino == parent.st_ino)
+    return true;
+  // A bind mount of a folder of the same file system shows only here.
+  struct statx extended {};
+  return ::statx(fd, "", AT_EMPTY_PATH | AT_SYMLINK_NOFOLLOW, 0, &extended) == 0 &&
+         (extended.stx_attributes_mask & STATX_ATTR_MOUNT_ROOT) != 0 &&
+         (extended.stx_attributes & STATX_ATTR_MOUNT_ROOT) != 0;
+}
+
 // Empties the directory open as `dirFd`. Entries are read in one pass into
 // memory first, so that removing them does not disturb the listing, and the
 // listing's own descriptor is closed before descending.
@@ -101,6 +120,11 @@ bool ClearDirectory(int dirFd, int depth, int maxDepth) noexcept {
     if (subFd < 0 && errno == EACCES && ::fchmodat(dirFd, name.c_str(), 0700, 0) == 0)
       subFd = ::openat(dirFd, name.c_str(), flags);
     if (subFd < 0) {
+      ok = false;
+      continue;
+    }
+    if (IsRootOrMountPoint(subFd)) {
+      ::close(subFd);
       ok = false;
       continue;
     }
@@ -181,15 +205,45 @@ int SKRFiles::MakeDirectory(const char* path) noexcept {
 }
 
 bool SKRFiles::RemoveTree(const char* path, int maxDepth) noexcept {
+  // The directory is reached as an entry of its parent, which stays open,
+  // so that the folder emptied is the one removed, whatever happens to the
+  // path meanwhile (its parts may even be removed with the tree).
+  const char* slash = std::strrchr(path, '/');
+  const char* name = slash != nullptr ? slash + 1 : path;
+  // "X/." and "p/c/.." name a folder through itself or a child, not as an
+  // entry of its parent: it could be emptied but never removed (and
+  // "p/c/.." would empty p). Refused, as is "/" (no name at all).
+  if (*name == '\0' || std::strcmp(name, ".") == 0 || std::strcmp(name, "..") == 0)
+    return false;
+  int parentFd = AT_FDCWD;
+  if (slash != nullptr) {
+    char parent[PATH_MAX];
+    const std::size_t length = slash == path ? 1 : std::size_t(slash - path);
+    if (length >= sizeof parent)
+      return false;
+    std::memcpy(parent, path, length);
+    parent[length] = '\0';
+    parentFd = ::open(parent, O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (parentFd < 0)
+      return false;
+  }
+  bool removed = false;
   struct stat info {};
-  if (::lstat(path, &info) != 0 || !S_ISDIR(info.st_mode))
-    return false;
-  const int fd = ::open(path, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
-  if (fd < 0)
-    return false;
-  const bool cleared = ClearDirectory(fd, 0, maxDepth);
-  ::close(fd);
-  return cleared && ::rmdir(path) == 0;
+  if (::fstatat(parentFd, name, &info, AT_SYMLINK_NOFOLLOW) == 0 && S_ISDIR(info.st_mode)) {
+    const int fd = ::openat(parentFd, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    // The root in any spelling, and mount points: rmdir would refuse them
+    // after everything inside was gone. Refused before anything is touched.
+    if (fd >= 0 && !IsRootOrMountPoint(fd)) {
+      const bool cleared = ClearDirectory(fd, 0, maxDepth);
+      ::close(fd);
+      removed = cleared && ::unlinkat(parentFd, name, AT_REMOVEDIR) == 0;
+    } else if (fd >= 0) {
+      ::close(fd);
+    }
+  }
+  if (parentFd != AT_FDCWD)
+    ::close(parentFd);
+  return removed;
 }
 
 bool SKRFiles::ListDirectory(const char* path, std::vector<std::string>& names) {

@@ -33,10 +33,13 @@ struct SKRFiles {
   static int MakeDirectory(const char* path) noexcept;
 
   // Removes the directory and everything below it. Symbolic links are
-  // removed, never followed: nothing outside the given directory is
-  // touched, and a path that is itself a symbolic link is refused. Keeps
-  // going after a failure and reports it at the end. `maxDepth` bounds the
-  // nesting it descends into (each level holds one descriptor).
+  // removed, never followed, and mount points are not entered: nothing
+  // outside the given directory is touched. Refused before anything is
+  // touched: a path that is itself a symbolic link, a path whose last
+  // component is "." or ".." (or "/", which has none), the root directory
+  // and the root of a mounted file system. Keeps going after a failure and
+  // reports it at the end. `maxDepth` bounds the nesting it descends into
+  // (each level holds one descriptor).
   static bool RemoveTree(const char* path, int maxDepth) noexcept;
 
   // The raw names of the directory's entries ("." and ".." included), in

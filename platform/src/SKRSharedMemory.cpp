@@ -1,5 +1,7 @@
 #include "SKRSharedMemory.h"
 
+#include "SKROwnerOnly.h"
+
 #include <cerrno>
 #include <cstdio>
 #include <ctime>
@@ -82,9 +84,10 @@ void InitializeMutex(void* memory) {
 
 }  // namespace
 
-std::string SKRSharedMemory::MakeObjectName(const std::string& name) {
+std::string SKRSharedMemory::MakeObjectName(EKRKind kind, const std::string& name) {
   char prefix[48];
-  std::snprintf(prefix, sizeof prefix, "/krCoreLib-%u-", unsigned(::getuid()));
+  std::snprintf(prefix, sizeof prefix, "/krCoreLib-%u-%s-", unsigned(::geteuid()),
+                kind == EKRKind::Memory ? "mem" : "lock");
   std::string result(prefix);
   std::string clean(name);
   for (char& c : clean) {
@@ -108,6 +111,9 @@ bool SKRSharedMemory::Attach(const std::string& objectName, std::size_t size, bo
     if (create) {
       int fd = ::shm_open(objectName.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
       if (fd >= 0) {
+        // The creation mode passed the umask, which may have taken the
+        // owner's own permissions away.
+        (void)::fchmod(fd, 0600);
         // Exclusive while the segment is sized and initialised: others
         // attaching wait for the shared lock below.
         if (Flock(fd, LOCK_EX) != 0 || IsUnlinked(fd)) {
@@ -132,10 +138,19 @@ bool SKRSharedMemory::Attach(const std::string& objectName, std::size_t size, bo
       if (errno != EEXIST)
         return false;
     }
-    int fd = ::shm_open(objectName.c_str(), (readOnly ? O_RDONLY : O_RDWR) | O_CLOEXEC, 0);
+    // O_NONBLOCK: a pipe planted under the name must not make open wait;
+    // it is refused below like everything that is not the user's own.
+    int fd = ::shm_open(objectName.c_str(), (readOnly ? O_RDONLY : O_RDWR) | O_NONBLOCK | O_CLOEXEC, 0);
     if (fd < 0) {
       if (errno == ENOENT && create)
         continue;  // removed by its last user a moment ago
+      return false;
+    }
+    // Another user's object, or one that others may read or write: its
+    // owner could read and change the memory or hold its lock for good.
+    // Refused, and neither locked nor removed.
+    if (!SKROwnerOnly::Check(fd, S_IFREG)) {
+      ::close(fd);
       return false;
     }
     if (Flock(fd, LOCK_EX | LOCK_NB) == 0) {
@@ -256,12 +271,12 @@ void SKRSharedMemory::Close(int& fd) noexcept {
   fd = -1;
 }
 
-SKRNamedMutex* SKRNamedMutex::Create(const std::string& objectName) noexcept {
+SKRNamedMutex* SKRNamedMutex::Create(const std::string& name) noexcept {
   SKRNamedMutex* mutex = new (std::nothrow) SKRNamedMutex();
   if (mutex == nullptr)
     return nullptr;
   bool ok;
-  if (objectName.empty()) {
+  if (name.empty()) {
     void* memory = ::mmap(nullptr, sizeof(SKRMutexBlock), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
     ok = memory != MAP_FAILED;
     if (ok) {
@@ -271,12 +286,12 @@ SKRNamedMutex* SKRNamedMutex::Create(const std::string& objectName) noexcept {
     }
   } else {
     try {
-      mutex->m_Name = objectName;
+      mutex->m_Name = SKRSharedMemory::MakeObjectName(SKRSharedMemory::EKRKind::Lock, name);
     } catch (...) {
       delete mutex;
       return nullptr;
     }
-    ok = SKRSharedMemory::Attach(objectName, sizeof(SKRMutexBlock), true, false, &InitializeMutex,
+    ok = SKRSharedMemory::Attach(mutex->m_Name, sizeof(SKRMutexBlock), true, false, &InitializeMutex,
                                  mutex->m_hSegment, mutex->m_View);
   }
   if (!ok) {

@@ -3,8 +3,13 @@
 // services.
 //
 // Named objects live in the system's shared-memory namespace under
-// "/krCoreLib-<uid>-<name>", so that the users of one machine do not meet
-// each other's objects. A segment lives while some process has it attached,
+// "/krCoreLib-<uid>-<kind>-<name>": each user has names of its own, and each
+// kind of object (memory, locks) a namespace of its own that names of the
+// other kind cannot reach. The namespace is open to every user, so an
+// object is used only when it belongs to the effective user and nobody else
+// may use it (checked on its descriptor); any other object of the name is
+// refused and left alone. Objects are created accessible to their owner
+// only. A segment lives while some process has it attached,
 // as named kernel objects do elsewhere: every attachment holds a shared
 // advisory lock on the segment, and the last one to detach (the one that
 // can turn its lock exclusive) removes the name. The kernel drops the locks
@@ -24,14 +29,17 @@ struct SKRMemoryView {
 };
 
 struct SKRSharedMemory {
-  // The shared-memory object name for a mapping name (UTF-8, without "/").
-  // Names too long for the namespace keep a readable prefix and end in a
-  // hash of the whole name.
-  static std::string MakeObjectName(const std::string& name);
+  enum class EKRKind { Memory, Lock };
+
+  // The shared-memory object name of a kind for a name (UTF-8, any bytes;
+  // "/" and NUL become "_"). Names too long for the namespace keep a
+  // readable prefix and end in a hash of the whole name.
+  static std::string MakeObjectName(EKRKind kind, const std::string& name);
 
   // Attaches to the named segment, creating it with `size` zero bytes when
   // `create` is set and it does not exist, and maps `size` bytes (read-only
-  // when asked). An existing segment smaller than `size` is refused. The
+  // when asked). An existing segment smaller than `size`, or one that is
+  // not the user's own (see above), is refused. The
   // creator runs `initialize` on the new memory before anyone else can map
   // it. `handle` receives the descriptor that holds the attachment.
   static bool Attach(const std::string& objectName, std::size_t size, bool create, bool readOnly,
@@ -57,16 +65,16 @@ struct SKRSharedMemory {
 };
 
 // A lock shared by every process that names it alike: a robust, recursive
-// process-shared mutex in its own small segment. A holder that dies
+// process-shared mutex in its own small segment (of the kind Lock). A holder that dies
 // releases it (the next waiter takes it over); the thread that took it
 // releases it. An unnamed lock lives in memory shared with forked children.
 class SKRNamedMutex {
 public:
   enum class EKRWait { Acquired, TimedOut, Failed };
 
-  // Null when the lock cannot be created or opened. An empty object name
-  // gives an unnamed lock.
-  static SKRNamedMutex* Create(const std::string& objectName) noexcept;
+  // Null when the lock cannot be created or opened. `name` is given to
+  // MakeObjectName with the kind Lock; an empty name gives an unnamed lock.
+  static SKRNamedMutex* Create(const std::string& name) noexcept;
   ~SKRNamedMutex();
   SKRNamedMutex(const SKRNamedMutex&) = delete;
   SKRNamedMutex& operator=(const SKRNamedMutex&) = delete;

@@ -13,9 +13,9 @@ constexpr std::size_t kTerminatorBytes = 2;
 // Mapped files and blocks are counted in 32 bits.
 constexpr std::uint64_t kMaxMappedSize = 0xFFFFFFFFull;
 
-std::string ObjectName(const CKRString& mappingName, const wchar_t* suffix) {
-  return SKRSharedMemory::MakeObjectName((mappingName + suffix).ToUtf8());
-}
+// The name of the lock that guards a mapping (in the namespace of locks,
+// which mapping names cannot reach).
+constexpr const wchar_t* kLockSuffix = L"MUTEX";
 
 }  // namespace
 
@@ -107,8 +107,16 @@ int CKRMemMapFile::AttachMemory(const wchar_t* name, std::uint32_t size, bool cr
   try {
     m_Name = MakeMappingName(name);
     m_bReadOnly = readOnly;
+    // A name without an exact UTF-8 form would share its object with every
+    // name that differs only where conversion replaced characters.
+    std::string utf8;
+    if (!SKRNativePath::ToUtf8(m_Name.str(), utf8)) {
+      UnMap();
+      return 0;
+    }
+    m_ObjectName = SKRSharedMemory::MakeObjectName(SKRSharedMemory::EKRKind::Memory, utf8);
     SKRMemoryView view;
-    if (!SKRSharedMemory::Attach(ObjectName(m_Name, L""), size, create, readOnly, nullptr, m_hMapping, view)) {
+    if (!SKRSharedMemory::Attach(m_ObjectName, size, create, readOnly, nullptr, m_hMapping, view)) {
       UnMap();
       return 0;
     }
@@ -127,8 +135,9 @@ int CKRMemMapFile::AttachMemory(const wchar_t* name, std::uint32_t size, bool cr
 }
 
 bool CKRMemMapFile::CreateMutex() {
-  // An unnamed mapping gets an unnamed lock.
-  m_pMutex = SKRNamedMutex::Create(m_Name.IsEmpty() ? std::string() : ObjectName(m_Name, L"MUTEX"));
+  // An unnamed mapping gets an unnamed lock. Names were checked (paths by
+  // their conversion, memory names above), so the conversion is exact.
+  m_pMutex = SKRNamedMutex::Create(m_Name.IsEmpty() ? std::string() : (m_Name + kLockSuffix).ToUtf8());
   return m_pMutex != nullptr;
 }
 
@@ -171,18 +180,10 @@ void CKRMemMapFile::UnMap() {
   view.m_Length = m_ViewLength;
   if (m_pView != nullptr && m_hFile >= 0 && !m_bReadOnly)
     SKRSharedMemory::Flush(view);
-  if (m_hMapping >= 0) {
-    try {
-      SKRSharedMemory::Detach(ObjectName(m_Name, L""), m_hMapping, view);
-    } catch (...) {
-      // No memory for the name: detach without removing it; the next user
-      // finds it stale and replaces it.
-      SKRSharedMemory::Unmap(view);
-      SKRSharedMemory::Close(m_hMapping);
-    }
-  } else {
+  if (m_hMapping >= 0)
+    SKRSharedMemory::Detach(m_ObjectName, m_hMapping, view);
+  else
     SKRSharedMemory::Unmap(view);
-  }
   SKRSharedMemory::Close(m_hFile);
   delete m_pMutex;
   m_pMutex = nullptr;
@@ -191,5 +192,6 @@ void CKRMemMapFile::UnMap() {
   m_bReadOnly = true;
   m_bAppendTerminator = false;
   m_Name.Empty();
+  m_ObjectName.clear();
   m_dwSize = 0;
 }

@@ -195,8 +195,6 @@ int CKRPathHelper::RemoveDirectoryW(const wchar_t* path) {
   // a link given as the directory is seen, and refused, as a link.
   while (native.size() > 1 && native.back() == '/')
     native.pop_back();
-  if (native == "/")
-    return 0;
   return SKRFiles::RemoveTree(native.c_str(), kMaxRemoveDepth) ? 1 : 0;
 }
 

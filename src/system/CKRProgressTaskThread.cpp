@@ -13,13 +13,8 @@ CKRProgressTaskThread::~CKRProgressTaskThread() {
   // part of the object still exists: cancel, wait 50 steps of 100 ms, kill.
   CancelTask();
   unsigned long exitCode = 0;
-  if (Stop(exitCode, 50) == 0) {
-    try {
-      Kill(0xFFFFFFFF, 0);
-    } catch (CKRThreadException* exception) {
-      exception->Delete();
-    }
-  }
+  if (Stop(exitCode, 50) == 0)
+    KillBeforeDestruction();
 }
 
 bool CKRProgressTaskThread::CancelTask() {

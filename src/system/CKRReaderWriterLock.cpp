@@ -2,6 +2,8 @@
 
 #include <krCoreLib/core/CKRDebugOutput.h>
 
+#include "SKRKillPoint.h"
+
 #include <algorithm>
 #include <memory>
 #include <vector>
@@ -29,9 +31,9 @@
 //
 // A writer takes the lock without m_Mutex only when it is completely free.
 //
-// The waits are cancellation points: a thread killed while it waits undoes
-// its own counting (the guards below) and passes on a wake-up it may have
-// swallowed, so the lock stays as if it had never asked.
+// The waits are kill points (CKRThread::Kill): a thread killed while it
+// waits undoes its own counting (the guards below) and passes on a wake-up
+// it may have swallowed, so the lock stays as if it had never asked.
 //
 // Which thread holds what is kept per thread (SKRLockHolds): the
 // non-reentrant lock uses it to refuse releases by threads that hold
@@ -216,14 +218,12 @@ void CKRReaderWriterLockState::LockReadSlow() {
     ~SKRUncount() { m_Count.fetch_sub(1, std::memory_order_relaxed); }
   } uncount{m_WaitingReaders};
   for (;;) {
+    SKRKillPoint::Wait(m_ReaderSignal, lock,
+                       [this] { return Writers(m_State.load(std::memory_order_relaxed)) == 0; });
     std::uint64_t state = m_State.load(std::memory_order_relaxed);
-    if (Writers(state) == 0) {
-      if (m_State.compare_exchange_weak(state, state + kOneReader, std::memory_order_acquire,
-                                        std::memory_order_relaxed))
-        return;
-      continue;
-    }
-    m_ReaderSignal.wait(lock);
+    if (Writers(state) == 0 && m_State.compare_exchange_weak(state, state + kOneReader, std::memory_order_acquire,
+                                                             std::memory_order_relaxed))
+      return;
   }
 }
 
@@ -256,7 +256,7 @@ void CKRReaderWriterLockState::LockWriteSlow() {
 // Called under m_Mutex by a writer already counted in the state; returns
 // when it holds the lock.
 void CKRReaderWriterLockState::WaitForWriteAccess(std::unique_lock<std::mutex>& lock) {
-  // Undoes the counting when the wait is cut short by a cancellation (the
+  // Undoes the counting when the wait is cut short by a kill (the
   // unwinding runs with m_Mutex held again).
   struct SKRUncount {
     CKRReaderWriterLockState& m_Lock;
@@ -271,17 +271,19 @@ void CKRReaderWriterLockState::WaitForWriteAccess(std::unique_lock<std::mutex>& 
         m_Lock.m_WriterSignal.notify_one();
     }
   } uncount{*this};
+  const auto writable = [this] {
+    const std::uint64_t state = m_State.load(std::memory_order_relaxed);
+    return Readers(state) == 0 && !WriterHolds(state);
+  };
   for (;;) {
+    SKRKillPoint::Wait(m_WriterSignal, lock, writable);
     std::uint64_t state = m_State.load(std::memory_order_relaxed);
-    if (Readers(state) == 0 && !WriterHolds(state)) {
-      if (m_State.compare_exchange_weak(state, state | kWriterHolds, std::memory_order_acquire,
-                                        std::memory_order_relaxed)) {
-        uncount.m_Done = true;
-        return;
-      }
-      continue;
+    if (Readers(state) == 0 && !WriterHolds(state) &&
+        m_State.compare_exchange_weak(state, state | kWriterHolds, std::memory_order_acquire,
+                                      std::memory_order_relaxed)) {
+      uncount.m_Done = true;
+      return;
     }
-    m_WriterSignal.wait(lock);
   }
 }
 
@@ -318,7 +320,7 @@ void CKRReaderWriterLockState::DowngradeToRead() {
 // The record of a lock is looked up (or made) before the thread asks for
 // the lock, and the lock given back before the record is updated, so that
 // little bookkeeping sits between the lock's atomic operations (which keeps
-// contending readers fast). A wait cut short by a cancellation leaves the
+// contending readers fast). A wait cut short by a kill leaves the
 // record as it was.
 
 void CReaderWriterLockNonReentrance::AcquireReaderLock() {

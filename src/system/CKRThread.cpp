@@ -2,6 +2,7 @@
 
 #include <krCoreLib/core/CKRDebugOutput.h>
 
+#include "SKRKillPoint.h"
 #include "SKRNativeThread.h"
 
 #include <algorithm>
@@ -25,11 +26,15 @@
 //   object and the thread touches nothing more.
 // - Threads are detached: nothing needs to join them, and a run is over
 //   once its bookkeeping is done, which is what Stop and Kill wait for.
-// - Kill cancels the thread (POSIX deferred cancellation). The thread
-//   unwinds its stack, so destructors run, locks held in RAII objects are
-//   released, and the run guard of ThreadEntry does the same bookkeeping as
-//   for a handler that returned. Every wait in this component and in the
-//   reader/writer locks is a cancellation point.
+// - Kill raises the run's kill request (a stop source) and waits, bounded,
+//   for the run to end. The thread sees the request at its next kill point
+//   (SKRKillPoint): every wait in this component and in the reader/writer
+//   locks is one, woken by the request. It throws SKRThreadKilled there,
+//   unwinds its stack, so destructors run and locks held in RAII objects
+//   are released, and ThreadEntry catches it; the run guard then does the
+//   same bookkeeping as for a handler that returned. Nothing cancels a
+//   thread from outside: code between kill points, the library's own file
+//   input and output included, always runs to its end.
 
 namespace {
 
@@ -40,22 +45,30 @@ std::mutex& InternalThreadSynchronization() {
 
 using SKRClock = std::chrono::steady_clock;
 
-// Waits on `signal` until `ready`, at most `steps` 100-ms steps
-// (KRTHREAD_INFINITE and above: without limit). Returns `ready()`.
-template <class TReady>
-bool WaitSteps(std::unique_lock<std::mutex>& lock, std::condition_variable& signal, unsigned long steps,
-               TReady ready) {
-  if (steps >= KRTHREAD_INFINITE) {
-    signal.wait(lock, ready);
-    return true;
-  }
-  const auto limit = SKRClock::now() + std::chrono::milliseconds(static_cast<long long>(steps) * 100);
-  return signal.wait_until(lock, limit, ready);
+// The deadline `steps` 100-ms steps from now; none for KRTHREAD_INFINITE
+// and above.
+std::optional<SKRClock::time_point> StepsDeadline(unsigned long steps) {
+  if (steps >= KRTHREAD_INFINITE)
+    return std::nullopt;
+  return SKRClock::now() + std::chrono::milliseconds(static_cast<long long>(steps) * 100);
 }
 
-// A recursive lock whose waits are condition-variable waits, so that a
-// thread waiting for it can be killed. Used for the synchronicity groups and
-// the process lock.
+// Waits on `signal` until `ready`, at most `steps` 100-ms steps
+// (KRTHREAD_INFINITE and above: without limit); a kill point. Returns
+// `ready()`.
+template <class TReady>
+bool WaitSteps(std::unique_lock<std::mutex>& lock, std::condition_variable_any& signal, unsigned long steps,
+               TReady ready) {
+  const std::optional<SKRClock::time_point> deadline = StepsDeadline(steps);
+  if (!deadline) {
+    SKRKillPoint::Wait(signal, lock, ready);
+    return true;
+  }
+  return SKRKillPoint::WaitUntil(signal, lock, *deadline, ready);
+}
+
+// A recursive lock whose waits are kill points. Used for the synchronicity
+// groups and the process lock.
 class SKRRecursiveWaitLock {
 public:
   void Lock() {
@@ -65,7 +78,7 @@ public:
       ++m_Depth;
       return;
     }
-    m_Released.wait(guard, [this] { return m_Depth == 0; });
+    SKRKillPoint::Wait(m_Released, guard, [this] { return m_Depth == 0; });
     m_Owner = self;
     m_Depth = 1;
   }
@@ -100,7 +113,7 @@ private:
   }
 
   std::mutex m_Mutex;
-  std::condition_variable m_Released;
+  std::condition_variable_any m_Released;
   std::thread::id m_Owner;
   int m_Depth = 0;
 };
@@ -168,23 +181,28 @@ struct SKRThreadRun {
   bool m_Started = false;
   bool m_Ended = false;
   bool m_Killed = false;
+  bool m_OnKillCalled = false;
   unsigned long m_KillExitCode = 0;
+  // Raised by Kill; the thread's kill points watch it. Thread-safe itself.
+  std::stop_source m_KillSource;
   // Signalled when the thread has started and when the run has ended.
   std::condition_variable m_Changed;
 };
 
 namespace {
 
+// The run of the calling thread, while it runs a handler.
+thread_local SKRThreadRun* t_pCurrentRun = nullptr;
+
 // Finishes the run however the handler leaves: by returning or by the
-// unwinding of a cancellation.
+// unwinding of a kill.
 class SKRRunGuard {
 public:
   explicit SKRRunGuard(std::shared_ptr<SKRThreadRun> run) : m_pRun(std::move(run)) {}
   SKRRunGuard(const SKRRunGuard&) = delete;
   SKRRunGuard& operator=(const SKRRunGuard&) = delete;
   ~SKRRunGuard() {
-    // A cancellation that arrives now must not cut the bookkeeping short.
-    SKRNativeThread::DisableCancellation();
+    t_pCurrentRun = nullptr;
     m_pRun->Finish(m_ExitCode);
   }
 
@@ -195,6 +213,16 @@ private:
 };
 
 }  // namespace
+
+// ---- kill points ---------------------------------------------------------------
+
+std::stop_token SKRKillPoint::Token() noexcept {
+  return t_pCurrentRun != nullptr ? t_pCurrentRun->m_KillSource.get_token() : std::stop_token();
+}
+
+void SKRKillPoint::Throw() {
+  throw SKRThreadKilled();
+}
 
 // ---- CKRThreadException ------------------------------------------------------
 
@@ -218,6 +246,7 @@ CKRThread::CKRThread(void* owner, long param)
       m_StackSize(0),
       m_Handle(0),
       m_ThreadID(0),
+      m_KillTimeout(kKillTimeoutSteps),
       m_ExitCode(0),
       m_ActivityStatus(KRTHREAD_STATUS_IDLE) {}
 
@@ -236,11 +265,27 @@ CKRThread::~CKRThread() {
   lock.unlock();
   CKRDebugOutput::Printf(L"CKRThread: a thread object was destroyed while its thread was running; the thread is "
                          L"killed.\n");
+  KillBeforeDestruction();
+}
+
+void CKRThread::KillBeforeDestruction() {
+  std::shared_ptr<SKRThreadRun> run;
+  {
+    std::lock_guard<std::mutex> lock(InternalThreadSynchronization());
+    if (!m_pRun || SKRNativeThread::IsCurrent(m_Handle))
+      return;
+    run = m_pRun;
+  }
   try {
     Kill(0xFFFFFFFF, 0);
+    return;
   } catch (CKRThreadException* exception) {
     exception->Delete();
   }
+  CKRDebugOutput::Printf(L"CKRThread: a thread to be destroyed has not reached a kill point in time; waiting for "
+                         L"it to end.\n");
+  std::unique_lock<std::mutex> lock(InternalThreadSynchronization());
+  run->m_Changed.wait(lock, [&run] { return run->m_Ended; });
 }
 
 void CKRThread::SetOwnerParams(void* owner, long param) {
@@ -361,7 +406,13 @@ void* CKRThread::ThreadEntry(void* argument) {
     run->m_Started = true;
     run->m_Changed.notify_all();
   }
-  guard.m_ExitCode = thread->ThreadHandler();
+  t_pCurrentRun = run.get();
+  try {
+    SKRKillPoint::Check();  // killed before the handler began
+    guard.m_ExitCode = thread->ThreadHandler();
+  } catch (const SKRThreadKilled&) {
+    // The run ends with the kill's exit code (EndRun).
+  }
   return nullptr;
 }
 
@@ -442,31 +493,59 @@ void CKRThread::Kill(unsigned long exitCode, int) {
   const std::shared_ptr<SKRThreadRun> run = m_pRun;
   if (!run)
     return;
-  if (run->m_Killed) {
-    // Another caller is killing it already: wait for the same end.
-    run->m_Changed.wait(lock, [&run] { return run->m_Ended; });
-    return;
+  if (!run->m_Killed) {
+    m_CommandQueue.clear();
+    run->m_Killed = true;
+    run->m_KillExitCode = exitCode;
   }
-  m_CommandQueue.clear();
-  run->m_Killed = true;
-  run->m_KillExitCode = exitCode;
   if (SKRNativeThread::IsCurrent(m_Handle)) {
+    // The thread ends itself: its run ends now, and the unwinding from here
+    // takes it out of its handler.
+    run->m_OnKillCalled = true;
     const std::optional<CKRString> releasedGroup = EndRun(exitCode);
     lock.unlock();
+    run->m_KillSource.request_stop();
     ReportReleasedGroup(releasedGroup);
     OnKill();
-    SKRNativeThread::ExitCurrent();
+    SKRKillPoint::Throw();
   }
-  const int error = SKRNativeThread::Cancel(m_Handle);
-  if (error != 0) {
-    run->m_Killed = false;
+  const unsigned long timeout = m_KillTimeout;
+  // Wakes the thread if it waits at a kill point. Raised outside the
+  // internal lock, which a woken thread needs.
+  lock.unlock();
+  run->m_KillSource.request_stop();
+  lock.lock();
+  const std::optional<SKRClock::time_point> deadline = StepsDeadline(timeout);
+  const auto ended = [&run] { return run->m_Ended; };
+  if (deadline)
+    run->m_Changed.wait_until(lock, *deadline, ended);
+  else
+    run->m_Changed.wait(lock, ended);
+  if (!run->m_Ended) {
     lock.unlock();
-    throw new CKRThreadException(this, CKRThreadException::GetLastSystemErrorMsg(static_cast<unsigned long>(error)),
+    throw new CKRThreadException(this, L"The thread has not reached a kill point in time.",
                                  KRTHREAD_ERROR_TERMINATE_FAILED);
   }
-  run->m_Changed.wait(lock, [&run] { return run->m_Ended; });
+  // One OnKill per kill, by the first caller to see the end.
+  const bool callOnKill = !run->m_OnKillCalled;
+  run->m_OnKillCalled = true;
   lock.unlock();
-  OnKill();
+  if (callOnKill)
+    OnKill();
+}
+
+void CKRThread::SetKillTimeout(unsigned long timeout) {
+  std::lock_guard<std::mutex> lock(InternalThreadSynchronization());
+  m_KillTimeout = timeout;
+}
+
+unsigned long CKRThread::GetKillTimeout() const {
+  std::lock_guard<std::mutex> lock(InternalThreadSynchronization());
+  return m_KillTimeout;
+}
+
+void CKRThread::KillPoint() {
+  SKRKillPoint::Check();
 }
 
 void CKRThread::OnKill() {}
@@ -516,6 +595,9 @@ void CKRThread::HandleCommandImmediately(int command) {
 }
 
 void CKRThread::WaitForNotification(int& command, unsigned long timeout) {
+  // A kill point before anything else: a thread that always finds a
+  // command queued is killable all the same.
+  SKRKillPoint::Check();
   std::unique_lock<std::mutex> lock(InternalThreadSynchronization());
   if (m_UsesNotification == 0) {
     command = KRTHREAD_CMD_NONE;
@@ -523,8 +605,9 @@ void CKRThread::WaitForNotification(int& command, unsigned long timeout) {
   }
   const auto ready = [this] { return !m_CommandQueue.empty(); };
   if (timeout >= KRTHREAD_INFINITE) {
-    m_CommandSignal.wait(lock, ready);
-  } else if (!m_CommandSignal.wait_until(lock, SKRClock::now() + std::chrono::milliseconds(timeout), ready)) {
+    SKRKillPoint::Wait(m_CommandSignal, lock, ready);
+  } else if (!SKRKillPoint::WaitUntil(m_CommandSignal, lock, SKRClock::now() + std::chrono::milliseconds(timeout),
+                                      ready)) {
     command = KRTHREAD_CMD_TIMEOUT;
     return;
   }

@@ -2,16 +2,21 @@
 
 #include <cstdint>
 
-bool SKRNativePath::ToNative(std::wstring_view path, std::string& native) {
-  native.clear();
-  if (path.empty() || path.size() > kMaxBytes)
-    return false;
-  for (const wchar_t c : path) {
+bool SKRNativePath::ToUtf8(std::wstring_view text, std::string& utf8) {
+  utf8.clear();
+  for (const wchar_t c : text) {
     const auto value = static_cast<std::uint32_t>(c);
     if (value == 0 || value > 0x10FFFF || (value >= 0xD800 && value <= 0xDFFF))
       return false;
   }
-  native = CKRString::ToUtf8(path.data(), static_cast<std::ptrdiff_t>(path.size()));
+  utf8 = CKRString::ToUtf8(text.data(), static_cast<std::ptrdiff_t>(text.size()));
+  return true;
+}
+
+bool SKRNativePath::ToNative(std::wstring_view path, std::string& native) {
+  native.clear();
+  if (path.empty() || path.size() > kMaxBytes || !ToUtf8(path, native))
+    return false;
   if (native.size() > kMaxBytes) {
     native.clear();
     return false;

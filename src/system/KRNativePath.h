@@ -1,4 +1,4 @@
-// Wide paths to the system's UTF-8 file names, and back.
+// Wide paths and names to the system's UTF-8 names, and back.
 #pragma once
 
 #include <krCoreLib/core/CKRString.h>
@@ -11,10 +11,13 @@ struct SKRNativePath {
   // (PATH_MAX, 4096, counts the terminator).
   static constexpr std::size_t kMaxBytes = 4095;
 
-  // The UTF-8 form of a path. False, naming no file, for null or empty
-  // text, an embedded NUL, a character without a UTF-8 form (a lone
-  // surrogate or a value above U+10FFFF, which conversion would silently
-  // replace and so name another file) or a result beyond kMaxBytes.
+  // The exact UTF-8 form of a text of any length. False for an embedded NUL
+  // and for a character without a UTF-8 form (a lone surrogate or a value
+  // above U+10FFFF): conversion would silently replace it, so that distinct
+  // texts would become one name.
+  static bool ToUtf8(std::wstring_view text, std::string& utf8);
+  // The UTF-8 form of a path: as ToUtf8, and false, naming no file, for
+  // null or empty text or a result beyond kMaxBytes.
   static bool ToNative(std::wstring_view path, std::string& native);
   static bool ToNative(const wchar_t* path, std::string& native) {
     return path != nullptr && ToNative(std::wstring_view(path), native);

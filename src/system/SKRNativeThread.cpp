@@ -58,21 +58,8 @@ int SKRNativeThread::Create(Entry entry, void* argument, unsigned long stackSize
   return error;
 }
 
-int SKRNativeThread::Cancel(std::uintptr_t handle) {
-  return pthread_cancel(ToNative(handle));
-}
-
 bool SKRNativeThread::IsCurrent(std::uintptr_t handle) {
   return pthread_equal(pthread_self(), ToNative(handle)) != 0;
-}
-
-void SKRNativeThread::DisableCancellation() {
-  int previous = 0;
-  pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &previous);
-}
-
-void SKRNativeThread::ExitCurrent() {
-  pthread_exit(nullptr);
 }
 
 unsigned long SKRNativeThread::CurrentThreadID() {

@@ -16,20 +16,8 @@ struct SKRNativeThread {
   // or the error number.
   static int Create(Entry entry, void* argument, unsigned long stackSize, std::uintptr_t& handle);
 
-  // Asks the thread to end at its next cancellation point (any blocking
-  // wait, sleep or I/O call); its stack is unwound, destructors run. Returns
-  // 0 or the error number.
-  static int Cancel(std::uintptr_t handle);
-
   // True when `handle` is the calling thread.
   static bool IsCurrent(std::uintptr_t handle);
-
-  // Makes the calling thread ignore cancellation from now on (used while a
-  // thread does its final bookkeeping).
-  static void DisableCancellation();
-
-  // Ends the calling thread at once, unwinding its stack.
-  [[noreturn]] static void ExitCurrent();
 
   // The kernel's ID of the calling thread (as shown by ps and debuggers).
   static unsigned long CurrentThreadID();

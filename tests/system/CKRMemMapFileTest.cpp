@@ -116,7 +116,24 @@ TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
   CKRMemMapFile larger;
   EXPECT_EQ(larger.MapMemory(name.GetString(), 200), 0) << "an existing block is not grown";
 
+  // A mapping named like the lock of another meets no lock: it starts as
+  // zeros, and writing it leaves the lock of `name` working.
+  CKRMemMapFile lockLike;
+  ASSERT_EQ(lockLike.MapMemory((name + L"MUTEX").GetString(), 32), 1);
+  auto* bytes = static_cast<unsigned char*>(lockLike.Open());
+  ASSERT_NE(bytes, nullptr);
+  EXPECT_EQ(std::count(bytes, bytes + 32, 0), 32);
+  std::memset(bytes, 0xFF, 32);
+  lockLike.Close();
+  ASSERT_NE(first.Open(0), nullptr);
+  bool otherGetsIt = true;
+  std::thread([&] { otherGetsIt = second.MapExistingMemory(name.GetString(), 100) == 1 && second.Open(0) != nullptr; })
+      .join();
+  EXPECT_FALSE(otherGetsIt) << "the lock still excludes";
+  first.Close();
+
   first.UnMap();   // gone with its last user
+  second.UnMap();
   EXPECT_EQ(second.MapExistingMemory(name.GetString(), 100), 0);
 
   // A name too long for the system's namespace is shortened alike.
@@ -127,7 +144,12 @@ TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
   ASSERT_EQ(second.MapExistingMemory(longName.GetString(), 8, true), 1);
   EXPECT_STREQ(static_cast<const char*>(second.Open()), "long");
 
+  // Names without an exact UTF-8 form would meet after conversion.
   CKRMemMapFile bad;
+  for (const wchar_t invalid : {wchar_t(0xD800), wchar_t(0xDBFF), wchar_t(0x110000)}) {
+    const CKRString invalidName = UniqueName(L"invalid") + CKRString(1, invalid);
+    EXPECT_EQ(bad.MapMemory(invalidName.GetString(), 8), 0);
+  }
   EXPECT_EQ(bad.MapMemory(L"", 8), 0);
   EXPECT_EQ(bad.MapMemory(name.GetString(), 0), 0);
   EXPECT_EQ(bad.MapExistingMemory(UniqueName(L"never made").GetString(), 8), 0);
@@ -191,4 +213,34 @@ TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
   EXPECT_STREQ(static_cast<const char*>(parent.Open(0)), "from the child");
   parent.Close();
   EXPECT_NE(parent.Open(0), nullptr) << "and it works as before afterwards";
+}
+
+TEST(CKRMemMapFile, MemoryNotTheUsersOwnIsRefusedAndLeftAlone) {
+  if (!KRCanActAsAnotherUser())
+    GTEST_SKIP() << "needs root to act as a second user";
+  const CKRString name = UniqueName(L"planted");
+  const std::vector<std::string> objects = KRSharedObjectsOf(name);   // the block and its lock
+  ASSERT_EQ(objects.size(), 2u);
+  CKRMemMapFile victim;
+  {
+    // Another user plants both, open to everyone, and keeps them in use.
+    CKRPlantedObjects planted(objects);
+    ASSERT_TRUE(planted.IsPlanted());
+    EXPECT_EQ(victim.MapMemory(name.GetString(), 64), 0);
+    EXPECT_EQ(victim.MapExistingMemory(name.GetString(), 64), 0);
+    EXPECT_EQ(victim.MapExistingMemory(name.GetString(), 64, true), 0);
+    for (const std::string& object : objects) {
+      struct stat info {};
+      EXPECT_EQ(::stat(object.c_str(), &info), 0) << object << " is left alone";
+      EXPECT_EQ(info.st_uid, KRAnotherUser());
+    }
+  }
+
+  // The user's own block, opened up to others, is refused as well.
+  const int fd = ::open(objects[0].c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
+  ASSERT_GE(fd, 0);
+  EXPECT_EQ(::fchmod(fd, 0644) | ::ftruncate(fd, 4096) | ::flock(fd, LOCK_SH), 0);
+  EXPECT_EQ(victim.MapExistingMemory(name.GetString(), 64, true) + victim.MapMemory(name.GetString(), 64), 0);
+  ::close(fd);
+  ::unlink(objects[0].c_str());
 }

@@ -2,6 +2,9 @@
 
 #include "KRFilesScratch.h"
 
+#include <sched.h>
+#include <sys/mount.h>
+
 TEST(CKRPathHelper, TextOperationsSplitAtTheLastSeparator) {
   // Path, extension, name, stem, folder.
   const std::array<const wchar_t*, 5> cases[] = {
@@ -139,10 +142,62 @@ TEST(CKRPathHelper, RemoveDirectoryRemovesTheTreeAndNothingOutside) {
   EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(scratch.Wide("link/").GetString()), 0);
   EXPECT_TRUE(CKRPathHelper::FileExists(scratch.Wide("outside/keep.txt").GetString()));
 
+  // Spellings that name a folder through itself or a child: refused, with
+  // nothing touched; a folder named through its parent goes.
+  std::filesystem::create_directories(scratch.Native("p/c/d"));
+  scratch.WriteFile("p/keep", "keep");
+  for (const char* spelling : {"p/.", "p/./", "p/c/..", "p/c/../", "p/c/d/../..", "p/c/../."}) {
+    SCOPED_TRACE(spelling);
+    EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(scratch.Wide(spelling).GetString()), 0);
+    EXPECT_TRUE(CKRPathHelper::FileExists(scratch.Wide("p/keep").GetString()));
+    EXPECT_TRUE(CKRPathHelper::FileExists(scratch.Wide("p/c/d").GetString()));
+  }
+  EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(scratch.Wide("p/c/d/../../c").GetString()), 1);
+  EXPECT_FALSE(CKRPathHelper::FileExists(scratch.Wide("p/c").GetString()));
+  EXPECT_TRUE(CKRPathHelper::FileExists(scratch.Wide("p/keep").GetString()));
+
   EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(scratch.Wide("missing").GetString()), 0);
   EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(scratch.Wide("outside-file").GetString()), 0);
   EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(nullptr), 0);
   EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(scratch.Wide("outside/").GetString()), 1) << "trailing slash";
+}
+
+// In a child confined to a scratch folder (its root) with mounts of its
+// own, so that a failing guard could empty nothing but the scratch folder.
+TEST(CKRPathHelper, RemoveDirectoryLeavesTheRootAndMountedFileSystemsAlone) {
+  if (!KRCanActAsAnotherUser())
+    GTEST_SKIP() << "needs root to confine a child to a scratch folder and mounts of its own";
+  CKRFilesScratch scratch;
+  scratch.WriteFile("canary", "x");
+  scratch.MakeFolder("sub");
+  scratch.MakeFolder("outside");
+  scratch.WriteFile("outside/keep", "keep");
+  scratch.MakeFolder("tree");
+  scratch.MakeFolder("tree/mounted");
+  scratch.WriteFile("tree/file", "f");
+  constexpr int kNoNamespace = 200;
+  const int status = KRRunInChild([&] {
+    // The bind mount is seen by this child only.
+    if (::unshare(CLONE_NEWNS) != 0 || ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0 ||
+        ::mount(scratch.Native("outside").c_str(), scratch.Native("tree/mounted").c_str(), nullptr, MS_BIND,
+                nullptr) != 0)
+      return kNoNamespace;
+    if (::chroot(scratch.Native().c_str()) != 0 || ::chdir("/") != 0)
+      return kNoNamespace + 1;
+    int removed = 0;
+    for (const wchar_t* root : {L"/", L"//", L"/.", L"/..", L"/./", L"/../..", L"/sub/..", L"/sub/../.", L"."})
+      removed += CKRPathHelper::RemoveDirectoryW(root);
+    // A mount point is refused, and a folder holding one is not removed.
+    removed += CKRPathHelper::RemoveDirectoryW(L"/tree/mounted");
+    removed += CKRPathHelper::RemoveDirectoryW(L"/tree");
+    return removed;
+  });
+  if (status == kNoNamespace)
+    GTEST_SKIP() << "no mount namespace of its own for the child";
+  EXPECT_EQ(status, 0);
+  for (const char* kept : {"canary", "sub", "outside/keep", "tree/mounted"})
+    EXPECT_TRUE(CKRPathHelper::FileExists(scratch.Wide(kept).GetString())) << kept;
+  EXPECT_FALSE(CKRPathHelper::FileExists(scratch.Wide("tree/file").GetString())) << "what could go is gone";
 }
 
 TEST(CKRPathHelper, GetChildPathsListsMatchingNames) {

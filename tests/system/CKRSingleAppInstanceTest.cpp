@@ -2,6 +2,11 @@
 
 #include "KRFilesScratch.h"
 
+#include <condition_variable>
+#include <mutex>
+#include <sys/socket.h>
+#include <sys/un.h>
+
 namespace {
 
 // A scratch folder as the runtime and temporary folder of the tests, never
@@ -32,15 +37,20 @@ CKRString UniqueID(const wchar_t* what) {
   return CKRString::Formatted(L"krFilesTestApp-%s-%d-%u", what, int(::getpid()), KRTestSeed());
 }
 
-// Whether a second instance, in a child process started in `folder`, finds
-// the first.
-bool DetectedInChild(const CKRString& id, std::vector<const char*> arguments = {}, const std::string& folder = "") {
-  return KRRunInChild([&] {
-           if (!folder.empty() && ::chdir(folder.c_str()) != 0)
-             return 10;
-           arguments.insert(arguments.begin(), "app");
-           return CKRSingleAppInstance::DetectAppInstance(id.GetString(), int(arguments.size()), arguments.data()) ? 0 : 1;
-         }) == 0;
+// What a second instance, in a child process started in `folder`, finds:
+// kNotDetected, or what became of its file (_EKRHandOver).
+constexpr int kNotDetected = -1;
+int DetectInChild(const CKRString& id, std::vector<const char*> arguments = {}, const std::string& folder = "") {
+  const int status = KRRunInChild([&] {
+    if (!folder.empty() && ::chdir(folder.c_str()) != 0)
+      return 10;
+    arguments.insert(arguments.begin(), "app");
+    _EKRHandOver handOver = KRHANDOVER_FAILED;
+    const bool detected =
+        CKRSingleAppInstance::DetectAppInstance(id.GetString(), int(arguments.size()), arguments.data(), &handOver);
+    return detected ? int(handOver) : 20 + int(handOver);
+  });
+  return status == 20 ? kNotDetected : status;
 }
 
 // What the running instance's listener was asked: an empty file name for an
@@ -69,7 +79,9 @@ private:
 TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
   CKRScratchRuntime scratch;
   const CKRString id = UniqueID(L"handover");
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr)) << "the first instance";
+  _EKRHandOver handOver = KRHANDOVER_FAILED;
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr, &handOver)) << "the first";
+  EXPECT_EQ(handOver, KRHANDOVER_NONE);
 
   // Each activation comes with the file it hands over, if any.
   CKRRequests requests;
@@ -83,26 +95,81 @@ TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
   // Started in another folder with a relative name; then an absolute name,
   // one that is not UTF-8 (not handed over, as it cannot be exactly), none.
   scratch.MakeFolder("elsewhere");
-  EXPECT_TRUE(DetectedInChild(id, {"-n", "docs/plan \xC3\xA9.txt", "second.txt"}, scratch.Native("elsewhere")));
-  EXPECT_TRUE(DetectedInChild(id, {"/data/model.kr"}));
-  EXPECT_TRUE(DetectedInChild(id, {"/data/bad\xFF.kr"}));
-  EXPECT_TRUE(DetectedInChild(id));
+  EXPECT_EQ(DetectInChild(id, {"-n", "docs/plan \xC3\xA9.txt", "second.txt"}, scratch.Native("elsewhere")),
+            KRHANDOVER_DELIVERED);
+  EXPECT_EQ(DetectInChild(id, {"/data/model.kr"}), KRHANDOVER_DELIVERED);
+  EXPECT_EQ(DetectInChild(id, {"/data/bad\xFF.kr"}), KRHANDOVER_FAILED);
+  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
   const CKRString relative = scratch.Wide("elsewhere/docs/plan \xC3\xA9.txt");
   EXPECT_EQ(requests.WaitFor(6), (std::vector<CKRString>{L"activation 1", relative, L"activation 2", L"/data/model.kr",
                                                          L"activation 3", L"activation 4"}));
 
   listener.Stop();
   EXPECT_FALSE(listener.IsRunning());
-  EXPECT_TRUE(DetectedInChild(id)) << "still running, though no longer listening";
+  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE) << "still running, though no longer listening";
+  EXPECT_EQ(DetectInChild(id, {"/data/model.kr"}), KRHANDOVER_FAILED);
+}
+
+// Fifty instances started at once, while four connections that never say
+// anything are held open: every file name arrives.
+TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
+  CKRScratchRuntime scratch;
+  const CKRString id = UniqueID(L"many");
+  CKRRequests requests;
+  CKRSingleAppInstanceListener listener;
+  ASSERT_TRUE(listener.Start(id.GetString(), nullptr, [&](const CKRString& file) { requests.Add(file); }));
+
+  const std::string socketPath = scratch.Native("run/krCoreLib-") + id.ToUtf8() + "-test.sock";
+  sockaddr_un address {};
+  address.sun_family = AF_UNIX;
+  ASSERT_LT(socketPath.size(), sizeof address.sun_path);
+  std::memcpy(address.sun_path, socketPath.c_str(), socketPath.size() + 1);
+  std::vector<int> silent;
+  for (int i = 0; i < 4; ++i) {
+    const int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    ASSERT_EQ(::connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0) << socketPath;
+    silent.push_back(fd);
+  }
+
+  constexpr int kInstances = 50;
+  int start[2];
+  ASSERT_EQ(::pipe(start), 0);
+  std::vector<pid_t> children;
+  std::vector<CKRString> expected;
+  for (int i = 0; i < kInstances; ++i) {
+    const std::string file = "/data/file-" + std::to_string(i) + ".kr";
+    expected.push_back(CKRString::FromUtf8(file));
+    children.push_back(KRStartChild([&] {
+      char byte = 0;
+      ::close(start[1]);
+      if (::read(start[0], &byte, 1) != 0)   // released all together
+        return 10;
+      const char* arguments[] = {"app", file.c_str()};
+      _EKRHandOver handOver = KRHANDOVER_NONE;
+      if (!CKRSingleAppInstance::DetectAppInstance(id.GetString(), 2, arguments, &handOver))
+        return 11;
+      return int(handOver);
+    }));
+  }
+  ::close(start[0]);
+  ::close(start[1]);
+  for (const pid_t child : children)
+    EXPECT_EQ(KRWaitChild(child), KRHANDOVER_DELIVERED);
+  std::vector<CKRString> received = requests.WaitFor(kInstances);
+  std::sort(received.begin(), received.end());
+  std::sort(expected.begin(), expected.end());
+  EXPECT_EQ(received, expected);
+  for (const int fd : silent)
+    ::close(fd);
 }
 
 TEST(CKRSingleAppInstance, TheLockEndsWithItsProcess) {
   CKRScratchRuntime scratch;
   // Separators and a length beyond a socket address: still one instance.
   const CKRString id = UniqueID(L"a/b\\c") + CKRString(300, L'x');
-  EXPECT_FALSE(DetectedInChild(id)) << "a first instance that ends";
+  EXPECT_EQ(DetectInChild(id), kNotDetected) << "a first instance that ends";
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr)) << "free again";
-  EXPECT_TRUE(DetectedInChild(id));
+  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
   EXPECT_EQ(KRRunInChild([&] {   // only the holder of the lock may listen
               CKRSingleAppInstanceListener listener;
               return listener.Start(id.GetString(), nullptr, nullptr) ? 1 : 0;
@@ -122,16 +189,53 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   ::unsetenv("XDG_RUNTIME_DIR");
   const CKRString id = UniqueID(L"fallback");
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr));
-  EXPECT_TRUE(DetectedInChild(id));
+  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
   const std::string privateName = "krCoreLib-" + std::to_string(::geteuid());
   struct stat info {};
   ASSERT_EQ(::lstat(scratch.Native(privateName).c_str(), &info), 0);
   EXPECT_EQ(info.st_mode & 0777, 0700u);
 
-  // ... and a folder of that name that is not private is not used.
+  // ... and a folder of that name that is not private is not used: a link,
+  // one open to others, or one of another user.
   scratch.MakeFolder("tmp2");
-  scratch.MakeLink(scratch.Native("run"), "tmp2/" + privateName);
   ::setenv("TMPDIR", scratch.Native("tmp2").c_str(), 1);
+  const std::string unsafe = "tmp2/" + privateName;
+  scratch.MakeLink(scratch.Native("run"), unsafe);
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"unsafe").GetString(), 0, nullptr));
   EXPECT_FALSE(listener.Start(UniqueID(L"unsafe").GetString(), nullptr, nullptr));
+  ::unlink(scratch.Native(unsafe).c_str());
+  scratch.MakeFolder(unsafe);
+  ::chmod(scratch.Native(unsafe).c_str(), 0770);
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"open").GetString(), 0, nullptr));
+  if (KRCanActAsAnotherUser()) {
+    ::chmod(scratch.Native(unsafe).c_str(), 0700);
+    ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), KRAnotherUser(), KRAnotherUser()), 0);
+    EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"other's").GetString(), 0, nullptr));
+    // A runtime folder of another user is passed over for the private one.
+    ASSERT_EQ(::chown(scratch.Native("run").c_str(), KRAnotherUser(), KRAnotherUser()), 0);
+    ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
+    ::setenv("TMPDIR", scratch.Native().c_str(), 1);
+    EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"passed over").GetString(), 0, nullptr));
+    EXPECT_EQ(DetectInChild(UniqueID(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
+  }
+}
+
+// Shared memory that another user planted under the application ID: the
+// file name is not written into it, and the hand-over is reported failed.
+TEST(CKRSingleAppInstance, AHandOverThroughMemoryOfAnotherUserFails) {
+  if (!KRCanActAsAnotherUser())
+    GTEST_SKIP() << "needs root to act as a second user";
+  CKRScratchRuntime scratch;
+  const CKRString id = UniqueID(L"planted");
+  const std::vector<std::string> objects = KRSharedObjectsOf(id);   // the block and its lock
+  ASSERT_EQ(objects.size(), 2u);
+  CKRRequests requests;
+  CKRSingleAppInstanceListener listener;
+  ASSERT_TRUE(listener.Start(
+      id.GetString(), [&] { requests.Add(L"activation"); }, [&](const CKRString& file) { requests.Add(file); }));
+  CKRPlantedObjects planted(objects);
+  ASSERT_TRUE(planted.IsPlanted());
+  EXPECT_EQ(DetectInChild(id, {"/data/secret.kr"}), KRHANDOVER_FAILED);
+  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
+  EXPECT_EQ(requests.WaitFor(2), (std::vector<CKRString>{L"activation", L"activation"})) << "no file arrived";
 }

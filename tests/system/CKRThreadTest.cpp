@@ -1,6 +1,11 @@
 #include <krCoreLib/system/CKRThread.h>
 
+#include <krCoreLib/system/CKRSystem.h>
+
 #include "KRThreadTestSupport.h"
+
+#include <cstdio>
+#include <unistd.h>
 
 using krtest::CFunctionThread;
 using krtest::CGate;
@@ -110,29 +115,53 @@ TEST(CKRThread, StopEndsAReactingHandlerAndReportsOneThatDoesNotReact) {
   EXPECT_EQ(ownStop.load(), 0);
 }
 
-TEST(CKRThread, KillEndsAWaitingThreadUnwindingItsStack) {
+TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
+  // The test thread holds the process lock throughout, so that taking it
+  // waits (groups wait alike).
+  CKRThread::OpenProcessLocking();
+  CKRThread::ProcessLock();
+
+  using Wait = std::function<void(CFunctionThread&)>;
+  const std::pair<const char*, Wait> cases[] = {
+      {"command wait", [](CFunctionThread& self) { krtest::IgnoreCommands(self); }},
+      // A timed wait, which a cancellation could not end under the address
+      // sanitizer.
+      {"timed command wait", [](CFunctionThread& self) { krtest::IgnoreCommands(self, 60000); }},
+      {"process lock", [](CFunctionThread&) { CKRThread::ProcessLock(); }},
+      {"status wait", [](CFunctionThread& self) { self.WaitForActivityStatus(99, KRTHREAD_INFINITE); }},
+      {"computing", [](CFunctionThread&) {
+         for (;;)
+           CKRThread::KillPoint();
+       }},
+  };
   std::atomic<int> unwound{0};
   struct SUnwind {
     std::atomic<int>& m_Count;
     ~SUnwind() { ++m_Count; }
   };
-  CFunctionThread thread([&](CFunctionThread& self) -> unsigned long {
-    SUnwind unwind{unwound};
-    for (int command = KRTHREAD_CMD_NONE;;)
-      self.WaitForNotification(command, KRTHREAD_INFINITE);   // ignores every command
-  });
-  thread.Kill(5);   // not running: nothing happens
-  EXPECT_EQ(thread.m_KillCount.load(), 0);
-  for (unsigned long run = 1; run <= 2; ++run) {
-    SCOPED_TRACE(run);
+  unsigned long run = 0;
+  for (const auto& [what, wait] : cases) {
+    SCOPED_TRACE(what);
+    ++run;
+    CGate atKillPoint;
+    CFunctionThread thread([&, wait = wait](CFunctionThread& self) -> unsigned long {
+      SUnwind unwind{unwound};
+      atKillPoint.Open();
+      wait(self);
+      return 1;
+    });
+    thread.Kill(5);   // not running: nothing happens
     thread.Start();
+    ASSERT_TRUE(atKillPoint.Wait());
     thread.Kill(70 + run);
     EXPECT_EQ(thread.IsAlive(), 0);
     EXPECT_EQ(thread.GetExitCode(), 70 + run);
     EXPECT_EQ(thread.GetActivityStatus(), KRTHREAD_STATUS_IDLE);
-    EXPECT_EQ(thread.m_KillCount.load(), static_cast<int>(run));
+    EXPECT_EQ(thread.m_KillCount.load(), 1);
     EXPECT_EQ(unwound.load(), static_cast<int>(run));
   }
+  CKRThread::ProcessUnlock();
+  CKRThread::CloseProcessLocking();
 
   // A handler may kill its own thread: it ends at once.
   std::atomic<bool> after{false};
@@ -146,6 +175,69 @@ TEST(CKRThread, KillEndsAWaitingThreadUnwindingItsStack) {
   EXPECT_FALSE(after.load());
   // OnKill runs on the ending thread, just after the run ended.
   EXPECT_TRUE(krtest::WaitUntil([&] { return suicidal.m_KillCount.load() == 1; }));
+}
+
+// Kill never cancels from outside: the library's input and output runs to
+// its end, and a thread inside it that does not come out in time is
+// reported, the process going on.
+TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
+  int channel[2];
+  ASSERT_EQ(::pipe(channel), 0);
+  std::FILE* input = ::fdopen(channel[0], "rb");
+  ASSERT_NE(input, nullptr);
+  CGate reading;
+  std::atomic<int> bytesRead{-1};
+  CFunctionThread reader([&](CFunctionThread& self) -> unsigned long {
+    unsigned char byte = 0;
+    reading.Open();
+    bytesRead = static_cast<int>(CKRSystem::Read1(input, 1, &byte));   // waits for the pipe
+    krtest::IgnoreCommands(self);
+  });
+  EXPECT_EQ(reader.GetKillTimeout(), CKRThread::kKillTimeoutSteps);
+  reader.SetKillTimeout(1);
+  reader.Start();
+  ASSERT_TRUE(reading.Wait());
+  try {
+    reader.Kill(5);
+    ADD_FAILURE() << "a thread reading an empty pipe was killed";
+  } catch (CKRThreadException* exception) {
+    EXPECT_EQ(exception->GetType(), KRTHREAD_ERROR_TERMINATE_FAILED);
+    exception->Delete();
+  }
+  EXPECT_EQ(reader.IsAlive(), 1);
+  EXPECT_EQ(reader.m_KillCount.load(), 0);
+  // Once the read is over, the pending kill ends the thread at its next
+  // kill point, with the kill's exit code (and no OnKill, as no Kill saw
+  // the end).
+  ASSERT_EQ(::write(channel[1], "x", 1), 1);
+  EXPECT_EQ(Stopped(reader), 5u);
+  EXPECT_EQ(bytesRead.load(), 1) << "the read ran to its end";
+  EXPECT_EQ(reader.m_KillCount.load(), 0);
+  std::fclose(input);
+  ::close(channel[1]);
+
+  // A stream of commands: the thread always finds one queued, yet ends.
+  std::atomic<long> taken{0};
+  CFunctionThread flooded([&](CFunctionThread& self) -> unsigned long {
+    for (int command = KRTHREAD_CMD_NONE;; ++taken)
+      self.WaitForNotification(command, KRTHREAD_INFINITE);
+  });
+  flooded.Start();
+  std::atomic<bool> flooding{true}, floodEnded{false};
+  std::thread flooder([&] {
+    const auto end = std::chrono::steady_clock::now() + krtest::kGenerous;
+    while (flooding.load() && std::chrono::steady_clock::now() < end) {
+      flooded.Pause();
+      flooded.Continue();
+    }
+    floodEnded = true;
+  });
+  EXPECT_TRUE(krtest::WaitUntil([&] { return taken.load() > 1000; }));
+  flooded.Kill(9);
+  EXPECT_FALSE(floodEnded.load()) << "Kill returned only when the commands stopped";
+  flooding = false;
+  flooder.join();
+  EXPECT_EQ(flooded.GetExitCode(), 9u);
 }
 
 TEST(CKRThread, MembersOfASynchronicityGroupExcludeEachOther) {
@@ -187,8 +279,7 @@ TEST(CKRThread, ARunEndingInsideItsGroupLockReleasesIt) {
   CFunctionThread killed([&](CFunctionThread& self) -> unsigned long {
     self.Lock();
     locked.Open();
-    for (int command = KRTHREAD_CMD_NONE;;)
-      self.WaitForNotification(command, KRTHREAD_INFINITE);
+    krtest::IgnoreCommands(self);
   });
   std::atomic<int> entered{0};
   CFunctionThread next([&](CFunctionThread& self) -> unsigned long {
@@ -251,36 +342,57 @@ TEST(CKRThread, TheProcessLockExcludesOtherThreadsWhileItExists) {
 namespace {
 
 // A thread class without a destructor of its own: the base's destructor
-// deals with a thread still running. The gates outlive the object, and the
-// handler takes them before it lets the test go on to destroy it.
+// deals with a thread still running. The handler takes what it needs
+// before it lets the test go on to destroy the object, then reads a pipe
+// (not a kill point) and waits for commands (one).
 class CBareThread : public CKRThread {
 public:
-  CBareThread(CGate& entered, CGate& never) : m_Entered(entered), m_Never(never) {}
+  CBareThread(CGate& entered, std::FILE* input) : m_Entered(entered), m_pInput(input) {
+    SetUsesNotification(1);
+    SetKillTimeout(1);
+  }
 
 protected:
   unsigned long ThreadHandler() override {
-    CGate& never = m_Never;
+    std::FILE* input = m_pInput;
     m_Entered.Open();
-    never.WaitToBeKilled();
-    return 0;
+    unsigned char byte = 0;
+    CKRSystem::Read1(input, 1, &byte);
+    for (int command = KRTHREAD_CMD_NONE;;)
+      WaitForNotification(command, KRTHREAD_INFINITE);
   }
 
 private:
   CGate& m_Entered;
-  CGate& m_Never;
+  std::FILE* m_pInput;
 };
 
 }  // namespace
 
 TEST(CKRThread, DestroyingARunningObjectKillsItsThread) {
   krtest::CDebugRecorder recorder;
-  CGate entered, never;
+  int channel[2];
+  ASSERT_EQ(::pipe(channel), 0);
+  std::FILE* input = ::fdopen(channel[0], "rb");
+  ASSERT_NE(input, nullptr);
+  // Feeds the read once the destructor has reported that it waits for it.
+  std::thread feeder([&] {
+    if (krtest::WaitUntil([&] { return recorder.Texts().size() >= 2; })) {
+      EXPECT_EQ(::write(channel[1], "x", 1), 1);
+    }
+  });
+  CGate entered;
   {
-    CBareThread running(entered, never);
+    CBareThread running(entered, input);
     running.SetSynchronicity(1, L"destroyed");
     running.Start();
-    ASSERT_TRUE(entered.Wait());
+    EXPECT_TRUE(entered.Wait());
   }
-  ASSERT_EQ(recorder.Texts().size(), 1u);
-  EXPECT_NE(recorder.Texts()[0].find(L"killed"), std::wstring::npos);
+  feeder.join();
+  const std::vector<std::wstring> texts = recorder.Texts();
+  ASSERT_EQ(texts.size(), 2u);
+  EXPECT_NE(texts[0].find(L"killed"), std::wstring::npos);
+  EXPECT_NE(texts[1].find(L"waiting for it to end"), std::wstring::npos);
+  std::fclose(input);
+  ::close(channel[1]);
 }

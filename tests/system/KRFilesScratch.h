@@ -4,6 +4,7 @@
 #pragma once
 
 #include <krCoreLib/core/CKRString.h>
+#include <krCoreLib/system/CKRMemMapFile.h>
 #include <krCoreLib/system/CKRSystem.h>
 
 #include "KRTestSeed.h"
@@ -30,6 +31,8 @@
 
 #include <dirent.h>
 #include <fcntl.h>
+#include <grp.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -157,3 +160,80 @@ inline int KRRunTestProgram(const std::string& program, const char* test) {
 inline bool KRPermissionsApply() {
   return ::geteuid() != 0;
 }
+
+// The second user of the tests that need one: "nobody" (65534), which owns
+// nothing of the tests.
+inline uid_t KRAnotherUser() {
+  return 65534;
+}
+// Whether a forked child can become that user (only root can).
+inline bool KRCanActAsAnotherUser() {
+  return ::geteuid() == 0;
+}
+// Makes the calling (forked, single-threaded) process that user for good.
+inline bool KRBecomeAnotherUser() {
+  const gid_t group = 65534;
+  return ::setgroups(0, nullptr) == 0 && ::setresgid(group, group, group) == 0 &&
+         ::setresuid(KRAnotherUser(), KRAnotherUser(), KRAnotherUser()) == 0;
+}
+
+// The system's paths of the shared memory named `name` and of its lock:
+// what appears in the shared-memory folder while it is mapped.
+inline std::vector<std::string> KRSharedObjectsOf(const CKRString& name) {
+  std::vector<std::string> paths;
+  CKRMemMapFile probe;
+  if (probe.MapMemory(name.GetString(), 8) != 1)
+    return paths;
+  const std::string part = CKRMemMapFile::MakeMappingName(name.GetString()).ToUtf8();
+  for (const auto& entry : std::filesystem::directory_iterator("/dev/shm")) {
+    if (entry.path().filename().string().find(part) != std::string::npos)
+      paths.push_back(entry.path().string());
+  }
+  return paths;
+}
+
+// Shared-memory objects that the second user plants under the given paths,
+// open to everyone and kept in use (locked, as live objects are) until the
+// planter is destroyed, which removes them.
+class CKRPlantedObjects {
+public:
+  explicit CKRPlantedObjects(std::vector<std::string> paths) : m_Paths(std::move(paths)) {
+    int planted[2], release[2];
+    if (::pipe(planted) != 0 || ::pipe(release) != 0)
+      return;
+    m_Child = KRStartChild([&] {
+      ::close(planted[0]);
+      ::close(release[1]);
+      if (!KRBecomeAnotherUser())
+        return 1;
+      for (const std::string& path : m_Paths) {
+        const int fd = ::open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+        if (fd < 0 || ::fchmod(fd, 0666) != 0 || ::ftruncate(fd, 1 << 16) != 0 || ::flock(fd, LOCK_SH) != 0)
+          return 2;
+      }
+      char byte = 0;
+      return ::write(planted[1], "!", 1) == 1 && ::read(release[0], &byte, 1) == 0 ? 0 : 3;
+    });
+    ::close(planted[1]);
+    ::close(release[0]);
+    m_Release = release[1];
+    char byte = 0;
+    m_Planted = m_Child > 0 && ::read(planted[0], &byte, 1) == 1;
+    ::close(planted[0]);
+  }
+  ~CKRPlantedObjects() {
+    ::close(m_Release);
+    EXPECT_EQ(KRWaitChild(m_Child), 0) << "the planter";
+    for (const std::string& path : m_Paths)
+      ::unlink(path.c_str());
+  }
+  CKRPlantedObjects(const CKRPlantedObjects&) = delete;
+  CKRPlantedObjects& operator=(const CKRPlantedObjects&) = delete;
+  bool IsPlanted() const { return m_Planted; }
+
+private:
+  std::vector<std::string> m_Paths;
+  pid_t m_Child = -1;
+  int m_Release = -1;
+  bool m_Planted = false;
+};

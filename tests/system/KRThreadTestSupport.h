@@ -64,12 +64,6 @@ public:
     std::unique_lock<std::mutex> lock(m_Mutex);
     return m_Signal.wait_for(lock, kGenerous, [this] { return m_Open; });
   }
-  // For a thread killed while it waits: a thread killed inside a timed wait
-  // trips a false report of this compiler's address sanitizer.
-  void WaitToBeKilled() {
-    std::unique_lock<std::mutex> lock(m_Mutex);
-    m_Signal.wait(lock, [this] { return m_Open; });
-  }
 
 private:
   std::mutex m_Mutex;
@@ -155,8 +149,7 @@ public:
   }
   ~CFunctionThread() override {
     // The handler is this class's: end the thread while it exists.
-    if (IsAlive() && !IsCurrentThread())
-      Kill(0xFFFFFFFF, 0);
+    KillBeforeDestruction();
   }
   using CKRThread::HandleCommandImmediately;
   using CKRThread::Lock;
@@ -179,6 +172,12 @@ inline constexpr unsigned long kNotStopped = 0xDEADu;
 inline unsigned long Stopped(CKRThread& thread) {
   unsigned long exitCode = 0;
   return thread.Stop(exitCode, kGenerousSteps) == 1 ? exitCode : kNotStopped;
+}
+
+// Ignores every command, forever: only Kill ends it.
+[[noreturn]] inline void IgnoreCommands(CFunctionThread& self, unsigned long timeout = KRTHREAD_INFINITE) {
+  for (int command = KRTHREAD_CMD_NONE;;)
+    self.WaitForNotification(command, timeout);
 }
 
 // Runs until "stop" arrives, then ends with `exitCode`.

@@ -3,10 +3,25 @@
 //
 // Mapping names: the given name (for MapFile with mappingNameFromPath, the
 // path) with every "\" and "/" replaced by "_" and its ASCII letters in upper
-// case; the lock is named by the mapping name followed by "MUTEX". Names are
+// case; the lock is named by the mapping name followed by "MUTEX", in a
+// namespace of locks apart from the mappings' (a mapping named "fooMUTEX"
+// never meets the lock of "foo"). A name with a character that has no UTF-8
+// form (a lone surrogate, a value above U+10FFFF) is refused. Names are
 // scoped to the user: processes of one user that use the same name share
 // the memory and the lock. Named shared memory lives while some process has
 // it mapped; a new block starts as zeros.
+//
+// Security: named memory and its lock are created accessible to their
+// owner only, and an existing one is used only when it belongs to the
+// effective user and nobody else may read or write it; one planted under
+// the name by another user (or opened up to others) makes the mapping fail
+// (0) and is left alone.
+//
+// Mapped files follow the platform's rule: when another process truncates
+// a file while it is mapped, touching the view beyond the file's new end
+// raises SIGBUS, which ends the process unless the host handles it. The
+// library reads mapped memory only within the size it found when mapping;
+// a host that maps files others may truncate must expect the signal.
 //
 // Writers bracket their access with Open and Close, which take and release
 // the lock; a read-only mapping is opened without it. The lock belongs to
@@ -23,6 +38,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <string>
 
 class SKRNamedMutex;
 
@@ -47,11 +63,11 @@ public:
   int MapFile(const wchar_t* path, bool readOnly = false, unsigned int shareMode = 0,
               bool appendTerminator = false, bool mappingNameFromPath = true, bool sparse = false);
   // Creates (or attaches to the existing) named shared memory of `size`
-  // bytes. An existing block smaller than `size` is refused. An empty name
-  // or a size of 0 fails.
+  // bytes. An existing block smaller than `size` or not the user's own is
+  // refused. An empty or invalid name or a size of 0 fails.
   int MapMemory(const wchar_t* name, std::uint32_t size, bool readOnly = false);
   // Attaches to existing named shared memory and maps `size` bytes of it;
-  // fails when it does not exist or is smaller.
+  // fails when it does not exist, is smaller or is not the user's own.
   int MapExistingMemory(const wchar_t* name, std::uint32_t size, bool readOnly = false);
   // Maps the open regular file behind `fileDescriptor`, as MapFile does
   // (unnamed); the object maps its own duplicate, so the caller keeps and
@@ -95,6 +111,7 @@ private:
   void* m_pView = nullptr;
   std::size_t m_ViewLength = 0;  // bytes mapped, whole pages
   CKRString m_Name;
+  std::string m_ObjectName;     // the system's name of the shared memory
   bool m_bOpen = false;
   SKRNamedMutex* m_pMutex = nullptr;
   std::uint32_t m_dwSize = 0;

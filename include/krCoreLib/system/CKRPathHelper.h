@@ -55,10 +55,14 @@ public:
   // the path or a parent exists as something else than a directory.
   static int CreatePath(const wchar_t* path);
   // Removes the directory with everything in it, subdirectories included.
-  // Symbolic links inside are removed, never followed; a path that is
-  // itself a symbolic link is refused (0) and nothing is touched. 1 when
-  // the directory is gone; 0 when it did not exist or something in it could
-  // not be removed (what could be removed is gone).
+  // Symbolic links inside are removed, never followed, and folders on
+  // which another file system is mounted are left (the call then fails).
+  // Refused (0) with nothing touched: a path that is itself a symbolic
+  // link, a path whose last component is "." or ".." ("X/.", "p/c/..";
+  // name the folder itself instead), the root directory in any spelling
+  // and the root of a mounted file system. 1 when the directory is gone; 0
+  // when it did not exist or something in it could not be removed (what
+  // could be removed is gone).
   static int RemoveDirectoryW(const wchar_t* path);
   // Appends to `list` the names (not full paths) of the entries of
   // `directory` that match `pattern` ("*" any run of characters, "?" one

@@ -63,7 +63,8 @@ public:
   // null task gives a thread that ends at once with exit code 0.
   CKRProgressTaskThread(IKRProgressTask* task, IKRProgressTaskObserver* observer);
   // A running task is cancelled and waited for (at most 5 seconds, then
-  // the thread is killed).
+  // the thread is killed; a task that ignores Cancel must reach a kill
+  // point, CKRThread::KillPoint, or the destructor waits for its end).
   ~CKRProgressTaskThread() override;
 
   IKRProgressTask* GetTask() const noexcept { return m_pTask; }

@@ -79,8 +79,9 @@ private:
   // move between processors.
   alignas(64) const std::uint64_t m_Serial;
   mutable std::mutex m_Mutex;
-  std::condition_variable m_ReaderSignal;
-  std::condition_variable m_WriterSignal;
+  // Waits on them are kill points (CKRThread::Kill).
+  std::condition_variable_any m_ReaderSignal;
+  std::condition_variable_any m_WriterSignal;
   std::atomic<int> m_WaitingReaders;
 };
 

@@ -18,10 +18,25 @@
 // Failures are thrown as pointers to new CKRThreadException objects; the
 // catcher deletes them (Delete()).
 //
-// Times: WaitForNotification takes milliseconds; Stop and
+// Times: WaitForNotification takes milliseconds; Stop, Kill's time-out and
 // WaitForActivityStatus take a count of 100-millisecond steps and return as
 // soon as the outcome is known. KRTHREAD_INFINITE (and anything above it)
 // waits without limit.
+//
+// Killing: Kill never cuts a thread off from outside. It asks the thread to
+// end, and the thread ends at its next kill point, unwinding its stack
+// (destructors run, locks held in RAII objects are released). The kill
+// points are: WaitForNotification (before it takes a command, so a stream
+// of commands cannot keep a thread alive, and while it waits, with or
+// without time-out), Lock, ProcessLock, the waits of the reader/writer
+// locks, Stop and WaitForActivityStatus called on the thread, and
+// KillPoint(). To be killable a handler reaches a kill point every so often
+// (a handler that computes or blocks in other calls for long calls
+// KillPoint() between steps) and lets the unwinding pass: a catch (...)
+// must rethrow, and a kill point must not be reached inside a noexcept
+// function (the unwinding would end the process there, as any exception
+// does). Library calls that are not kill points (file input and output, for
+// instance) always run to their end.
 #pragma once
 
 #include <krCoreLib/core/CKRString.h>
@@ -118,8 +133,9 @@ public:
   CKRThread& operator=(const CKRThread&) = delete;
   // A thread still running when its object is destroyed is killed (and the
   // fact reported on CKRDebugOutput); derived classes should stop their
-  // thread in their own destructor, while their part of the object exists.
-  // A handler may delete its own object and then return at once.
+  // thread in their own destructor, while their part of the object exists
+  // (KillBeforeDestruction). A handler may delete its own object and then
+  // return at once.
   virtual ~CKRThread();
 
   void SetOwnerParams(void* owner, long param);
@@ -158,15 +174,26 @@ public:
   // (`exitCode` KRTHREAD_STILL_ACTIVE). Called from the thread itself, it
   // only queues the command and returns 0.
   int Stop(unsigned long& exitCode, unsigned long timeout = KRTHREAD_INFINITE);
-  // Ends a running thread at its next cancellation point (any wait of this
-  // library, a condition-variable or sleep or blocking I/O call), unwinding
-  // its stack, and waits for that; then the exit code is `exitCode` and
-  // OnKill() is called. A handler that computes without ever reaching a
-  // cancellation point delays Kill until it does; a handler must let the
-  // unwinding pass (a catch (...) that does not rethrow ends the process).
-  // Called from the thread itself it ends the thread at once. `flag` is not
-  // used. Throws type 3 when the system refuses.
+  // Ends a running thread at its next kill point (see above) and waits at
+  // most the kill time-out for that; then the exit code is `exitCode` and
+  // OnKill() is called. When the thread has not ended in time, throws type
+  // 3 ("The thread has not reached a kill point in time."): the kill stays
+  // pending, and the thread ends with `exitCode` at the kill point it
+  // reaches next; a later Kill waits for that end again (and calls OnKill
+  // when it sees it). Called from the thread itself it ends the thread at
+  // once, by unwinding from the call. Nothing for a thread that is not
+  // running. `flag` is not used.
   void Kill(unsigned long exitCode = 0xFFFFFFFF, int flag = 0);
+  // How long Kill waits, in 100-ms steps; kKillTimeoutSteps (5 seconds)
+  // at construction, KRTHREAD_INFINITE waits without limit.
+  static constexpr unsigned long kKillTimeoutSteps = 50;
+  void SetKillTimeout(unsigned long timeout);
+  unsigned long GetKillTimeout() const;
+  // A kill point for handlers and the code they call (a long computation,
+  // the Run of a progress task): ends the calling thread here when Kill has
+  // asked it to; nothing otherwise, and nothing on threads that CKRThread
+  // did not start.
+  static void KillPoint();
 
   // Queue the command. Return 0 when the thread is not running, else 1.
   int Run();
@@ -209,6 +236,13 @@ public:
   static void CloseProcessLocking();
 
 protected:
+  // For destructors: kills a running thread (not the calling one) as Kill
+  // does and, when it has not ended within the kill time-out, reports that
+  // on CKRDebugOutput and waits for its end without limit, since the
+  // object must outlive the handler that runs on it. A handler that never
+  // reaches a kill point keeps the destructor waiting.
+  void KillBeforeDestruction();
+
   // The body of the thread; the result is its exit code.
   virtual unsigned long ThreadHandler() = 0;
   // Called after Kill has ended the thread (on the thread that called Kill).
@@ -249,10 +283,12 @@ private:
   unsigned long m_StackSize;
   std::uintptr_t m_Handle;
   unsigned long m_ThreadID;
-  // Signalled when a command is queued (the notification event).
-  std::condition_variable m_CommandSignal;
+  // Signalled when a command is queued (the notification event). Waits on
+  // both signals are kill points.
+  std::condition_variable_any m_CommandSignal;
   // Signalled when the activity status changes or a run ends.
-  std::condition_variable m_StateSignal;
+  std::condition_variable_any m_StateSignal;
+  unsigned long m_KillTimeout;
   unsigned long m_ExitCode;
   int m_ActivityStatus;
   std::deque<int> m_CommandQueue;
