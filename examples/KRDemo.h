@@ -19,5 +19,6 @@ inline void PrintSection(const wchar_t* title) {
 void KRDemoObjectModel();
 void KRDemoUnits();
 void KRDemoMath();
+void KRDemoGeometry();
 void KRDemoFiles();
 void KRDemoThreads();

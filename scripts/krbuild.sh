@@ -15,7 +15,7 @@ root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 
 # Everything the build, the tests and the benchmarks need.
 packages=(g++ cmake ninja-build pkg-config uuid-dev libgtest-dev libgmock-dev libbenchmark-dev
-  libeigen3-dev libudunits2-dev locales)
+  libeigen3-dev libudunits2-dev libcgal-dev locales)
 
 missing=()
 for package in "${packages[@]}"; do
