@@ -289,7 +289,7 @@ void Polygon::insertEdge(const Pointbase& v) {
   if (std::ostream* out = trace())
     *out << "set e" << v.m_Id << " helper to " << v.m_Id << "\n"
          << "Insert e" << v.m_Id << " to splay tree\n"
-         << "key:" << edge.keyValue() << "\n";
+         << "Insert key:" << edge.keyValue() << "\n";
   m_Status.Insert(&edge);
 }
 
@@ -300,7 +300,8 @@ void Polygon::removePreviousEdge(const Pointbase& v) {
   previous.setKeyValue(v.m_Y);
   m_Status.Delete(previous.keyValue());
   if (std::ostream* out = trace())
-    *out << "Remove e" << previous.id() << " from splay tree\n";
+    *out << "Remove e" << previous.id() << " from splay tree\n"
+         << "key:" << previous.keyValue() << "\n";
 }
 
 bool Polygon::updateLeftEdge(const Pointbase& v, bool joinAnyHelper) {

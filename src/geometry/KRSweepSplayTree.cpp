@@ -144,14 +144,20 @@ void SplayTree::Insert(Linebase* edge) {
 
 void SplayTree::remove(BTreeNode* root) noexcept {
   // root is the tree's root: join its subtrees. Splaying the left subtree
-  // at the removed key brings its largest node up, which has no right child.
+  // at the removed key brings its largest node up, which has no right child
+  // while the keys are in order. Keys out of order (edges of invalid input
+  // that cross) may leave one: the right subtree then goes below the
+  // rightmost node, so that no node is lost.
   const double k = key(root);
   BTreeNode* joined = nullptr;
   if (root->m_pLeft == nullptr) {
     joined = root->m_pRight;
   } else {
     joined = splay(k, root->m_pLeft);
-    joined->m_pRight = root->m_pRight;
+    BTreeNode* rightmost = joined;
+    while (rightmost->m_pRight != nullptr)
+      rightmost = rightmost->m_pRight;
+    rightmost->m_pRight = root->m_pRight;
   }
   delete root;
   --m_Size;

@@ -96,6 +96,28 @@ TEST(SplayTree, OperationsMatchAnOrderedSet) {
   EXPECT_EQ(Keys(copy), std::vector<double>(expected.begin(), expected.end()));
 }
 
+TEST(SplayTree, KeysOutOfOrderLoseNoNode) {
+  // Edges of invalid input cross, and their keys fall out of order: the
+  // searches then go astray, but no operation may lose or repeat a node.
+  std::mt19937 random(KRTestSeed());
+  std::uniform_real_distribution<double> values(0, 100);
+  CKREdgeSupply supply;
+  SplayTree tree;
+  std::vector<Linebase*> edges;
+  for (int step = 0; step < 3000; ++step) {
+    if (step % 3 != 2 || edges.empty()) {
+      edges.push_back(supply.Horizontal(values(random)));
+      tree.Insert(edges.back());
+    } else {
+      edges[random() % edges.size()]->increaseKeyValue(values(random) - 50);
+      tree.Delete(edges[random() % edges.size()]->keyValue());
+    }
+    long reachable = 0;
+    tree.InOrder([&reachable](BTreeNode*) { ++reachable; });
+    ASSERT_EQ(reachable, tree.Size()) << "step " << step;
+  }
+}
+
 TEST(SplayTree, EqualKeysAreShiftedApart) {
   CKREdgeSupply supply;
   SplayTree tree;

@@ -48,6 +48,9 @@
 // and the polygon is not reused. AddContour after Finish() and the passes
 // before Finish() return false and change nothing.
 //
+// Coordinates far below 1e-140 in magnitude may underflow in the exact
+// orientation test; the results then need not be right, but stay safe.
+//
 // The polygon owns its points and edges. Not thread-safe; distinct polygons
 // may be used from different threads (the shared standard output aside).
 #pragma once
