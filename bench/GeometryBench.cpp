@@ -26,6 +26,8 @@
 // (the ratios use CPU time, the median when repetitions are aggregated)
 #include <krCoreLib/geometry/KRSweepPolygon.h>
 
+#include "KRMedianReporter.h"
+
 #include <CGAL/Constrained_Delaunay_triangulation_2.h>
 #include <CGAL/Exact_predicates_inexact_constructions_kernel.h>
 #include <CGAL/Triangulation_face_base_with_info_2.h>
@@ -36,6 +38,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <iomanip>
@@ -240,28 +243,9 @@ void RegisterAll() {
 
 // ---- reporting --------------------------------------------------------------------
 
-// The console reporter, which also keeps each benchmark's CPU time per
-// vertex (the median when repetitions are aggregated) and prints the
-// ratios against the targets at the end.
-class CKRRatioReporter : public benchmark::ConsoleReporter {
+// Prints the ratios against the targets at the end.
+class CKRRatioReporter : public CKRMedianReporter {
 public:
-  void ReportRuns(const std::vector<Run>& runs) override {
-    ConsoleReporter::ReportRuns(runs);
-    for (const Run& run : runs) {
-      if (run.error_occurred || run.counters.count("vertices") == 0)
-        continue;
-      const std::string name = run.run_name.function_name;
-      const double nanoseconds = run.GetAdjustedCPUTime() * (1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit)) /
-                                 run.counters.at("vertices").value;
-      if (run.run_type == Run::RT_Iteration && m_MedianSeen.count(name) == 0)
-        m_Times[name] = nanoseconds;
-      else if (run.run_type == Run::RT_Aggregate && run.aggregate_name == "median") {
-        m_Times[name] = nanoseconds;
-        m_MedianSeen[name] = true;
-      }
-    }
-  }
-
   void Finalize() override {
     ConsoleReporter::Finalize();
     std::ostream& out = GetOutputStream();
@@ -288,9 +272,11 @@ public:
           << (slowest / fastest <= 2 ? "met" : "MISSED") << "\n";
   }
 
-private:
-  std::map<std::string, double> m_Times;
-  std::map<std::string, bool> m_MedianSeen;
+protected:
+  double ItemsPerIteration(const Run& run) const override {
+    const auto vertices = run.counters.find("vertices");
+    return vertices != run.counters.end() ? vertices->second.value : 0;
+  }
 };
 
 }  // namespace

@@ -25,6 +25,8 @@
 // over the three sides; the ratios use the medians)
 #include <krCoreLib/krCoreLib.h>
 
+#include "KRMedianReporter.h"
+
 #include <Eigen/Core>
 #include <Eigen/Geometry>
 #include <benchmark/benchmark.h>
@@ -214,29 +216,9 @@ KR_MATH_BENCHMARKS(Affine)
 
 // ---- reporting --------------------------------------------------------------------
 
-// The console reporter, which also keeps each benchmark's CPU time per
-// element (the median when repetitions are aggregated; CPU time, because
-// other work on a shared machine inflates real time) and prints the ratios
-// against the targets at the end.
-class CKRRatioReporter : public benchmark::ConsoleReporter {
+// Prints the ratios against the targets at the end.
+class CKRRatioReporter : public CKRMedianReporter {
 public:
-  void ReportRuns(const std::vector<Run>& runs) override {
-    ConsoleReporter::ReportRuns(runs);
-    for (const Run& run : runs) {
-      if (run.error_occurred)
-        continue;
-      const std::string name = run.run_name.function_name;
-      const double nanoseconds = run.GetAdjustedCPUTime() *
-                                 (1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit)) / kCount;
-      if (run.run_type == Run::RT_Iteration && m_MedianSeen.count(name) == 0)
-        m_Times[name] = nanoseconds;
-      else if (run.run_type == Run::RT_Aggregate && run.aggregate_name == "median") {
-        m_Times[name] = nanoseconds;
-        m_MedianSeen[name] = true;
-      }
-    }
-  }
-
   void Finalize() override {
     ConsoleReporter::Finalize();
     std::ostream& out = GetOutputStream();
@@ -260,9 +242,8 @@ public:
       }
   }
 
-private:
-  std::map<std::string, double> m_Times;
-  std::map<std::string, bool> m_MedianSeen;
+protected:
+  double ItemsPerIteration(const Run&) const override { return kCount; }
 };
 
 }  // namespace

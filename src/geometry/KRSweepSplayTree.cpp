@@ -180,25 +180,33 @@ BTreeNode* SplayTree::Find(double target) {
   return key(m_pRoot) == target ? m_pRoot : nullptr;
 }
 
-BTreeNode* SplayTree::FindMin() {
+BTreeNode* SplayTree::findExtreme(BTreeNode* BTreeNode::*side) {
   if (m_pRoot == nullptr)
     return nullptr;
   BTreeNode* node = m_pRoot;
-  while (node->m_pLeft != nullptr)
-    node = node->m_pLeft;
+  while (node->*side != nullptr)
+    node = node->*side;
   m_pRoot = splay(key(node), m_pRoot);
   return node;
 }
 
-BTreeNode* SplayTree::FindMax() {
-  if (m_pRoot == nullptr)
-    return nullptr;
-  BTreeNode* node = m_pRoot;
-  while (node->m_pRight != nullptr)
-    node = node->m_pRight;
-  m_pRoot = splay(key(node), m_pRoot);
-  return node;
+void SplayTree::deleteExtreme(BTreeNode* BTreeNode::*side, BTreeNode* BTreeNode::*other) {
+  // The splay brings the extreme node up (to the root while the keys are in
+  // order); it is then unlinked where it is, which holds whatever the keys.
+  if (findExtreme(side) == nullptr)
+    return;
+  BTreeNode** link = &m_pRoot;
+  while ((*link)->*side != nullptr)
+    link = &((*link)->*side);
+  BTreeNode* node = *link;
+  *link = node->*other;
+  delete node;
+  --m_Size;
 }
+
+BTreeNode* SplayTree::FindMin() { return findExtreme(&BTreeNode::m_pLeft); }
+
+BTreeNode* SplayTree::FindMax() { return findExtreme(&BTreeNode::m_pRight); }
 
 bool SplayTree::FindMaxSmallerThan(double target, BTreeNode*& node) {
   node = nullptr;
@@ -217,15 +225,9 @@ bool SplayTree::FindMaxSmallerThan(double target, BTreeNode*& node) {
   return node != nullptr;
 }
 
-void SplayTree::DeleteMin() {
-  if (BTreeNode* node = FindMin())
-    remove(node);
-}
+void SplayTree::DeleteMin() { deleteExtreme(&BTreeNode::m_pLeft, &BTreeNode::m_pRight); }
 
-void SplayTree::DeleteMax() {
-  if (BTreeNode* node = FindMax())
-    remove(node);
-}
+void SplayTree::DeleteMax() { deleteExtreme(&BTreeNode::m_pRight, &BTreeNode::m_pLeft); }
 
 void SplayTree::MakeEmpty() noexcept {
   reclaimMemory(m_pRoot);

@@ -110,7 +110,13 @@ TEST(SplayTree, KeysOutOfOrderLoseNoNode) {
       tree.Insert(edges.back());
     } else {
       edges[random() % edges.size()]->increaseKeyValue(values(random) - 50);
-      tree.Delete(edges[random() % edges.size()]->keyValue());
+      const int action = int(random() % 3);
+      if (action == 0)
+        tree.Delete(edges[random() % edges.size()]->keyValue());
+      else if (action == 1)
+        tree.DeleteMin();
+      else
+        tree.DeleteMax();
     }
     long reachable = 0;
     tree.InOrder([&reachable](BTreeNode*) { ++reachable; });

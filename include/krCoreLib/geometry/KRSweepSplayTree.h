@@ -90,7 +90,12 @@ private:
   static BTreeNode* rotateWithRightChild(BTreeNode* k1) noexcept;
   static BTreeNode* clone(const BTreeNode* root);
   static void reclaimMemory(BTreeNode* root) noexcept;
+  // Removes the root, joining its subtrees.
   void remove(BTreeNode* root) noexcept;
+  // The leftmost (side m_pLeft) or rightmost node, splayed up; and its
+  // removal.
+  BTreeNode* findExtreme(BTreeNode* BTreeNode::*side);
+  void deleteExtreme(BTreeNode* BTreeNode::*side, BTreeNode* BTreeNode::*other);
 
   BTreeNode* m_pRoot = nullptr;
   long m_Size = 0;
