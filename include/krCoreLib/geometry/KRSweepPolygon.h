@@ -23,7 +23,8 @@
 // n + 2h - 2 triangles, each three vertex ids in counter-clockwise order.
 //
 // Output and failure: triangulation() writes "Total number of triangles:"
-// with the count to standard output. Malformed input is reported to
+// with the count and a newline ("Total number of triangles:8\n") to
+// standard output. Malformed input is reported to
 // standard output with the diagnostic texts below, the triangulation stops,
 // triangulation() returns false and the triangle list and the monotone
 // pieces are empty:
