@@ -6,8 +6,9 @@
 //
 // A program derives from CKRBenchReporter, writes Summarize with Ratio and
 // Find, and passes an instance to benchmark::RunSpecifiedBenchmarks.
-// Benchmarks are found by the name the console prints (for example
-// "BM_Read<SStdShared>/real_time/threads:1" or "float/Add/krCoreLib").
+// Benchmarks are found by their name, arguments and thread count, as the
+// console prints them without the options of the run (for example
+// "BM_Read<SStdShared>/threads:1", "BM_Save/10000" or "float/Add/krCoreLib").
 #pragma once
 
 #include <benchmark/benchmark.h>
@@ -43,9 +44,12 @@ public:
     for (const Run& run : runs) {
       if (run.error_occurred)
         continue;
-      const std::string name = run.run_name.str();
+      const double units = UnitsPerIteration(run);
+      if (!(units > 0))
+        continue;
+      const std::string name = Key(run);
       const double time = (m_Time == ETime::Real ? run.GetAdjustedRealTime() : run.GetAdjustedCPUTime()) *
-                          (1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit)) / m_UnitsPerIteration;
+                          (1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit)) / units;
       if (run.run_type == Run::RT_Iteration) {
         m_Samples[name].push_back({time, run.counters});
       } else if (run.aggregate_name == "median") {
@@ -68,6 +72,10 @@ public:
 
 protected:
   virtual void Summarize(std::ostream& out) = 0;
+
+  // The units one iteration of `run` processes (by default the
+  // constructor's); 0 leaves the run out of the summary.
+  virtual double UnitsPerIteration(const Run&) const { return m_UnitsPerIteration; }
 
   // The median aggregate when repetitions were reported, otherwise the
   // median of the runs.
@@ -118,6 +126,15 @@ protected:
   }
 
 private:
+  static std::string Key(const Run& run) {
+    std::string key = run.run_name.function_name;
+    if (!run.run_name.args.empty())
+      key += "/" + run.run_name.args;
+    if (!run.run_name.threads.empty())
+      key += "/" + run.run_name.threads;
+    return key;
+  }
+
   ETime m_Time;
   double m_UnitsPerIteration;
   std::map<std::string, std::vector<SKRResult>> m_Samples;

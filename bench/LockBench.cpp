@@ -109,8 +109,8 @@ class CKRLockReporter : public CKRBenchReporter {
 protected:
   void Summarize(std::ostream& out) override {
     const auto pair = [&](const char* test, const char* lock, const char* threads) {
-      const std::string name = std::string(test) + "<" + lock + ">/real_time/threads:" + threads;
-      const std::string peer = std::string(test) + "<SStdShared>/real_time/threads:" + threads;
+      const std::string name = std::string(test) + "<" + lock + ">/threads:" + threads;
+      const std::string peer = std::string(test) + "<SStdShared>/threads:" + threads;
       return std::pair{name, peer};
     };
     out << "\n1. Reader pair, one thread (target <= 2x std::shared_mutex)\n";

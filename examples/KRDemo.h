@@ -20,5 +20,6 @@ void KRDemoObjectModel();
 void KRDemoSerialization();
 void KRDemoUnits();
 void KRDemoMath();
+void KRDemoGeometry();
 void KRDemoFiles();
 void KRDemoThreads();

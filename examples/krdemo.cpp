@@ -12,6 +12,8 @@ int main() {
   KRDemoUnits();
   PrintSection(L"Math in two precisions");
   KRDemoMath();
+  PrintSection(L"Geometry: exact orientation and triangulation");
+  KRDemoGeometry();
   PrintSection(L"Paths, files and mapped memory");
   KRDemoFiles();
   PrintSection(L"Threads and locks");

@@ -17,7 +17,7 @@ root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 # with the tests, run by hand) need the rest.
 packages=(g++ cmake ninja-build pkg-config)
 if [[ $mode != demo ]]; then
-  packages+=(libgtest-dev libgmock-dev locales libbenchmark-dev uuid-dev libeigen3-dev libudunits2-dev)
+  packages+=(libgtest-dev libgmock-dev locales libbenchmark-dev uuid-dev libeigen3-dev libudunits2-dev libcgal-dev)
 fi
 
 missing=()

@@ -65,6 +65,12 @@
 #include <krCoreLib/math/CKRVector4T.h>
 #include <krCoreLib/math/CKRVectorT.h>
 
+// Geometry.
+#include <krCoreLib/geometry/KRAdaptiveOrient2d.h>
+#include <krCoreLib/geometry/KRSweepElements.h>
+#include <krCoreLib/geometry/KRSweepPolygon.h>
+#include <krCoreLib/geometry/KRSweepSplayTree.h>
+
 // System services.
 #include <krCoreLib/system/CKRMemMapFile.h>
 #include <krCoreLib/system/CKRPathHelper.h>
