@@ -237,9 +237,11 @@ TEST_F(CKRDocumentTest, HostileStoredDataLoadsSafely) {
   CKRTestRecord::s_RefuseInitialize = true;
   EXPECT_EQ(GetRecord(document, refused), nullptr);
   CKRTestRecord::s_RefuseInitialize = false;
-  EXPECT_NE(GetRecord(document, refused), nullptr);  // and once it initialises
+  CKRTestRecord* accepted = GetRecord(document, refused);  // and once it initialises
+  ASSERT_NE(accepted, nullptr);
   archive->Release();
   loaded->Release();
+  accepted->Release();
 }
 
 // Containers refuse unsuitable types and taken IDs, report absent IDs as
