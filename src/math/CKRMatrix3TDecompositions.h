@@ -41,6 +41,17 @@ Real Hypot(Real a, Real b) {
   return a * std::sqrt(Real(1) + ratio * ratio);
 }
 
+// The same, faster: the square root of the sum of squares where that keeps
+// full precision (no square overflows, the sum is not subnormal).
+template <class Real>
+Real Norm(Real a, Real b) {
+  const Real squares = a * a + b * b;
+  if (squares >= std::numeric_limits<Real>::min() / std::numeric_limits<Real>::epsilon() &&
+      squares <= std::numeric_limits<Real>::max())
+    return std::sqrt(squares);
+  return Hypot(a, b);
+}
+
 // (c, s) of the plane rotation taking (y, z) to (r, 0): c = y / r, s = z / r.
 template <class Real>
 void Givens(Real y, Real z, Real& c, Real& s) {
@@ -127,8 +138,8 @@ bool LargestEntry(const CKRMatrix3T<Real, Other>& m, bool upper, Real& largest) 
 // a decomposition; 0 for a matrix within the safe range (and for zero).
 template <class Real>
 int ScaleExponent(Real largest) {
-  if (largest == Real(0) ||
-      (largest >= std::ldexp(Real(1), -kScaleLimit) && largest <= std::ldexp(Real(1), kScaleLimit)))
+  static_assert(kScaleLimit == 30, "the literals below are 2^-30 and 2^30");
+  if (largest == Real(0) || (largest >= Real(0x1p-30) && largest <= Real(0x1p30)))
     return 0;
   int exponent = 0;
   std::frexp(largest, &exponent);
@@ -140,6 +151,14 @@ void Scale(CKRMatrix3T<Real, Other>& m, int exponent) {
   if (exponent != 0)
     for (int i = 0; i < 9; ++i)
       m[0][i] = std::ldexp(m[0][i], exponent);
+}
+
+// The diagonal matrix of d0, d1, d2 scaled back by 2^-exponent.
+template <class Real, class Other>
+CKRMatrix3T<Real, Other> Unscaled(Real d0, Real d1, Real d2, int exponent) {
+  if (exponent == 0)
+    return CKRMatrix3T<Real, Other>(d0, d1, d2);
+  return CKRMatrix3T<Real, Other>(std::ldexp(d0, -exponent), std::ldexp(d1, -exponent), std::ldexp(d2, -exponent));
 }
 
 template <class Real, class Other>
@@ -176,9 +195,10 @@ bool CKRMatrix3T<Real, Other>::Tridiagonalize(Real d[3], Real e[2]) noexcept {
     *this = IDENTITY;
     return false;
   }
-  const Real length = Hypot(a01, a02);
-  const Real c = a01 / length;
-  const Real s = a02 / length;
+  const Real length = Norm(a01, a02);
+  const Real inverse = Real(1) / length;
+  const Real c = a01 * inverse;
+  const Real s = a02 * inverse;
   const Real q = Real(2) * c * a12 + s * (a22 - a11);
   d[1] = a11 + s * q;
   d[2] = a22 - s * q;
@@ -210,15 +230,17 @@ bool CKRMatrix3T<Real, Other>::QLAlgorithm(Real d[3], Real e[2]) noexcept {
         converged = false;
         break;
       }
+      // |g| stays below 1 / epsilon (sub[i0] is not negligible against the
+      // diagonal), so its square cannot overflow.
       Real g = (d[i0 + 1] - d[i0]) / (Real(2) * sub[i0]);
-      Real r = Hypot(g, Real(1));
+      Real r = Math::Sqrt(g * g + Real(1));
       g = d[i2] - d[i0] + sub[i0] / (g + (g < Real(0) ? -r : r));
       Real s = Real(1), c = Real(1), p = Real(0);
       bool underflow = false;
       for (int i3 = i2 - 1; i3 >= i0; --i3) {
         const Real f = s * sub[i3];
         const Real b = c * sub[i3];
-        r = Hypot(f, g);
+        r = Norm(f, g);
         sub[i3 + 1] = r;
         if (r == Real(0)) {
           // Both parts of the rotation underflowed: the split is found.
@@ -227,8 +249,9 @@ bool CKRMatrix3T<Real, Other>::QLAlgorithm(Real d[3], Real e[2]) noexcept {
           underflow = true;
           break;
         }
-        s = f / r;
-        c = g / r;
+        const Real inverse = Real(1) / r;
+        s = f * inverse;
+        c = g * inverse;
         g = d[i3 + 1] - p;
         r = (d[i3] - g) * s + Real(2) * c * b;
         p = s * r;
@@ -276,7 +299,7 @@ void CKRMatrix3T<Real, Other>::EigenDecomposition(CKRMatrix3T& rot, CKRMatrix3T&
   if (rot.Determinant() < Real(0))
     for (int r = 0; r < 3; ++r)
       rot(r, 2) = -rot(r, 2);
-  diag = CKRMatrix3T(std::ldexp(d[0], -exponent), std::ldexp(d[1], -exponent), std::ldexp(d[2], -exponent));
+  diag = Unscaled<Real, Other>(d[0], d[1], d[2], exponent);
 }
 
 // ---- singular value decomposition ----
@@ -410,7 +433,7 @@ void CKRMatrix3T<Real, Other>::SingularValueDecomposition(CKRMatrix3T& left, CKR
       SwapColumns(left, i, i + 1);
       SwapColumns(right, i, i + 1);
     }
-  diag = CKRMatrix3T(std::ldexp(d[0], -exponent), std::ldexp(d[1], -exponent), std::ldexp(d[2], -exponent));
+  diag = Unscaled<Real, Other>(d[0], d[1], d[2], exponent);
 }
 
 template <class Real, class Other>
@@ -449,7 +472,7 @@ void CKRMatrix3T<Real, Other>::QDUDecomposition(CKRMatrix3T& q, CKRMatrix3T& d, 
         r(i, k) = -r(i, k);
         q(k, i) = -q(k, i);
       }
-  d = CKRMatrix3T(std::ldexp(r(0, 0), -exponent), std::ldexp(r(1, 1), -exponent), std::ldexp(r(2, 2), -exponent));
+  d = Unscaled<Real, Other>(r(0, 0), r(1, 1), r(2, 2), exponent);
   u = IDENTITY;
   for (int i = 0; i < 2; ++i)
     for (int j = i + 1; j < 3; ++j)

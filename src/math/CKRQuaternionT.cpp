@@ -192,7 +192,8 @@ CKRQuaternionT<Real, Other> Interpolate(Real t, const CKRQuaternionT<Real, Other
     const CKRQuaternionT<Real, Other> across(-p.X(), p.W(), -p.Z(), p.Y());
     return p * Math::Cos(turn) + across * Math::Sin(turn);
   }
-  return (p * Math::Sin((Real(1) - t) * angle - phase) + q * Math::Sin(t * angle + phase)) / Math::Sin(angle);
+  const Real inverse = Real(1) / Math::Sin(angle);
+  return p * (Math::Sin((Real(1) - t) * angle - phase) * inverse) + q * (Math::Sin(t * angle + phase) * inverse);
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 
 #include <krCoreLib/math/CKRMatrixT.h>
 #include <krCoreLib/math/CKRVector4T.h>
+#include <krCoreLib/math/SKRMatrixLanes.h>
 
 template <class Real, class Other>
 class CKRMatrix4T : public CKRMatrixT<4, Real, Other> {
@@ -40,29 +41,22 @@ public:
   CKRMatrix4T& operator=(const CKRMatrix4T&) noexcept = default;
 
   // The determinant and the adjoint (the transposed cofactors, so that
-  // this * Adjoint() = Determinant() * IDENTITY), both from the twelve 2 x 2
-  // minors of rows 0-1 and rows 2-3.
-  Real Determinant() const noexcept {
-    Real determinant;
-    Minors(nullptr, determinant);
-    return determinant;
-  }
+  // this * Adjoint() = Determinant() * IDENTITY), both from the 2 x 2
+  // blocks of the matrix (SKRMatrixLanes).
+  Real Determinant() const noexcept { return Lanes::Determinant(this->m_Entry); }
   CKRMatrix4T Adjoint() const noexcept {
     CKRMatrix4T adjoint{typename Base::SKRUninitialized{}};
-    Real determinant;
-    Minors(&adjoint, determinant);
+    Lanes::Adjugate(this->m_Entry, adjoint.m_Entry, false);
     return adjoint;
   }
   // The adjoint divided by the determinant; ZERO when abs(determinant) <=
   // EPSILON (1.1920928955078125e-07, an absolute threshold) or when the
   // determinant is not finite.
-  CKRMatrix4T Inverse() const noexcept {
-    CKRMatrix4T adjoint{typename Base::SKRUninitialized{}};
-    Real determinant;
-    Minors(&adjoint, determinant);
-    if (!Base::IsInvertible(determinant))
+  [[gnu::always_inline]] CKRMatrix4T Inverse() const noexcept {
+    CKRMatrix4T inverse{typename Base::SKRUninitialized{}};
+    if (!Base::IsInvertible(Lanes::Adjugate(this->m_Entry, inverse.m_Entry, true)))
       return ZERO;
-    return adjoint * (Real(1) / determinant);
+    return inverse;
   }
 
   // ---- builders ----
@@ -76,35 +70,9 @@ public:
   static CKRMatrix4T BuildScalingMatrix(Vector4 s) noexcept;
 
 private:
-  explicit CKRMatrix4T(typename Base::SKRUninitialized tag) noexcept : Base(tag) {}
+  using Lanes = SKRMatrixLanes<Real>;
 
-  // The determinant, and the adjoint unless `adjoint` is null.
-  void Minors(CKRMatrix4T* adjoint, Real& determinant) const noexcept {
-    const Real* m = this->m_Entry;
-    const Real a0 = m[0] * m[5] - m[1] * m[4];
-    const Real a1 = m[0] * m[6] - m[2] * m[4];
-    const Real a2 = m[0] * m[7] - m[3] * m[4];
-    const Real a3 = m[1] * m[6] - m[2] * m[5];
-    const Real a4 = m[1] * m[7] - m[3] * m[5];
-    const Real a5 = m[2] * m[7] - m[3] * m[6];
-    const Real b0 = m[8] * m[13] - m[9] * m[12];
-    const Real b1 = m[8] * m[14] - m[10] * m[12];
-    const Real b2 = m[8] * m[15] - m[11] * m[12];
-    const Real b3 = m[9] * m[14] - m[10] * m[13];
-    const Real b4 = m[9] * m[15] - m[11] * m[13];
-    const Real b5 = m[10] * m[15] - m[11] * m[14];
-    determinant = a0 * b5 - a1 * b4 + a2 * b3 + a3 * b2 - a4 * b1 + a5 * b0;
-    if (adjoint == nullptr)
-      return;
-    *adjoint = CKRMatrix4T(m[5] * b5 - m[6] * b4 + m[7] * b3, -m[1] * b5 + m[2] * b4 - m[3] * b3,
-                           m[13] * a5 - m[14] * a4 + m[15] * a3, -m[9] * a5 + m[10] * a4 - m[11] * a3,
-                           -m[4] * b5 + m[6] * b2 - m[7] * b1, m[0] * b5 - m[2] * b2 + m[3] * b1,
-                           -m[12] * a5 + m[14] * a2 - m[15] * a1, m[8] * a5 - m[10] * a2 + m[11] * a1,
-                           m[4] * b4 - m[5] * b2 + m[7] * b0, -m[0] * b4 + m[1] * b2 - m[3] * b0,
-                           m[12] * a4 - m[13] * a2 + m[15] * a0, -m[8] * a4 + m[9] * a2 - m[11] * a0,
-                           -m[4] * b3 + m[5] * b1 - m[6] * b0, m[0] * b3 - m[1] * b1 + m[2] * b0,
-                           -m[12] * a3 + m[13] * a1 - m[14] * a0, m[8] * a3 - m[9] * a1 + m[10] * a0);
-  }
+  explicit CKRMatrix4T(typename Base::SKRUninitialized tag) noexcept : Base(tag) {}
 };
 
 template <class Real, class Other>

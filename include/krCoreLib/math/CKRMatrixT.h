@@ -22,6 +22,7 @@
 #include <krCoreLib/math/CKRMathT.h>
 #include <krCoreLib/math/CKRPointT.h>
 #include <krCoreLib/math/CKRVectorT.h>
+#include <krCoreLib/math/SKRMatrixLanes.h>
 
 #include <cstring>
 #include <limits>
@@ -127,16 +128,8 @@ public:
 
   // ---- products ----
   // The matrix times a column vector or point; the result is of the same kind.
-  Vector operator*(const Vector& v) const noexcept {
-    Vector product;
-    ForEach([&](int i) { product[i] = RowTimes(i, v); });
-    return product;
-  }
-  Point operator*(const Point& p) const noexcept {
-    Point product;
-    ForEach([&](int i) { product[i] = RowTimes(i, p); });
-    return product;
-  }
+  Vector operator*(const Vector& v) const noexcept { return Times(v); }
+  Point operator*(const Point& p) const noexcept { return Times(p); }
   CKRMatrixT operator*(const CKRMatrixT& m) const noexcept { return Product<false, false>(*this, m); }
   CKRMatrixT& operator*=(const CKRMatrixT& m) noexcept { return *this = *this * m; }
   CKRMatrixT Transpose() const noexcept {
@@ -205,7 +198,17 @@ protected:
     ForEachEntry([&](int i) { result.m_Entry[i] = function(i); });
     return result;
   }
-  // Row i times the components of a vector or point, left to right.
+  // The matrix times the components of a vector or point: row by row, left
+  // to right; four rows side by side in four lanes.
+  template <class Tuple>
+  Tuple Times(const Tuple& v) const noexcept {
+    Tuple product;
+    if constexpr (N == 4)
+      SKRMatrixLanes<Real>::RowDots(m_Entry, v.GetTuple(), product.GetTuple());
+    else
+      ForEach([&](int i) { product[i] = RowTimes(i, v); });
+    return product;
+  }
   template <class Tuple>
   Real RowTimes(int i, const Tuple& v) const noexcept {
     Real sum = m_Entry[i * N] * v[0];
