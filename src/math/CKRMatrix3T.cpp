@@ -1,9 +1,11 @@
 // CKRMatrix3T: construction, rotations (axis and angle, Euler angles,
 // interpolation) and Gram-Schmidt; the decompositions are defined in
-// CKRMatrix3TDecompositions.h. Both precision pairs are compiled here.
+// CKRMatrix3TEigen.h and CKRMatrix3TSingular.h. Both precision pairs are
+// compiled here.
 #include <krCoreLib/math/CKRMatrix3T.h>
 
-#include "CKRMatrix3TDecompositions.h"
+#include "CKRMatrix3TEigen.h"
+#include "CKRMatrix3TSingular.h"
 
 #include <cmath>
 #include <numbers>

@@ -245,7 +245,9 @@ CKRQuaternionT<Real, Other> CKRQuaternionT<Real, Other>::Align(const Vector3& fr
   Vector3::GenerateOrthonormalBasis(perpendicular, unused, direction, false);
   if (perpendicular.Normalize() == Real(0))
     return IDENTITY;
-  return CKRQuaternionT(Real(0), perpendicular.X(), perpendicular.Y(), perpendicular.Z());
+  // + 0 turns the -0 of a negated zero component into 0.
+  return CKRQuaternionT(Real(0), perpendicular.X() + Real(0), perpendicular.Y() + Real(0),
+                        perpendicular.Z() + Real(0));
 }
 
 template <class Real, class Other>

@@ -165,7 +165,9 @@ TYPED_TEST(CKRMatrix3TTest, GramSchmidtGivesOrthonormalColumns) {
       continue;
     Mat3 q = m;
     q.Orthonormalize();
-    ASSERT_LE(KROrthogonalityError(q), 64 * TestFixture::kEpsilon);
+    // Gram-Schmidt loses orthogonality in proportion to the condition.
+    const double condition = KRMaxEntry(m) * KRMaxEntry(m.Inverse()) * 9;
+    ASSERT_LE(KROrthogonalityError(q), 16 * TestFixture::kEpsilon * condition);
     // Column 0 keeps its direction; the determinant its sign.
     ASSERT_NEAR(V3(q.GetColumn(0)).Dot(V3(m.GetColumn(0)).GetNormalized()), 1.0, 8 * TestFixture::kEpsilon);
     ASSERT_EQ(q.Determinant() > 0, m.Determinant() > 0);

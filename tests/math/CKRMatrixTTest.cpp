@@ -69,24 +69,17 @@ TYPED_TEST(CKRMatrixTTest, ConstructionAndAccessShareTheRowMajorLayout) {
   EXPECT_EQ(V2(Mat2(pair[0], pair[1]) * pair[1]), pair[0] * pair[1].Dot(pair[1]));
 }
 
-TYPED_TEST(CKRMatrixTTest, ArithmeticIsEntrywiseAndComparisonBitwise) {
+// Division by zero fills with MAX_REAL; equality is bitwise and the order
+// that of the byte images.
+TYPED_TEST(CKRMatrixTTest, DivisionByZeroAndComparison) {
   KR_MATH_TEST_TYPES;
   std::mt19937 random(KRTestSeed());
   for (int i = 0; i < 200; ++i) {
-    const Mat4 a = KRRandomMatrix<Mat4>(random, 10), b = KRRandomMatrix<Mat4>(random, 10);
-    const Real s = Real(std::uniform_real_distribution<double>(-3, 3)(random));
-    const Mat4 sum = a + b, difference = a - b, scaled = s * a, negated = -a;
-    for (int e = 0; e < 16; ++e) {
-      const int r = e / 4, c = e % 4;
-      ASSERT_EQ(sum(r, c), Real(a(r, c) + b(r, c)));
-      ASSERT_EQ(difference(r, c), Real(a(r, c) - b(r, c)));
-      ASSERT_EQ(scaled(r, c), Real(a(r, c) * s));
-      ASSERT_EQ(negated(r, c), -a(r, c));
-    }
-    Mat4 accumulated = a;
-    ASSERT_EQ(Mat4((accumulated += b) -= a), Mat4((a + b) - a));
-    ASSERT_EQ(a < b, std::memcmp(a[0], b[0], sizeof a) < 0);
-    ASSERT_EQ(a >= b, !(a < b));
+    const Mat4 a = KRRandomMatrix<Mat4>(random), b = i % 10 ? KRRandomMatrix<Mat4>(random) : a;
+    const int bytes = std::memcmp(a[0], b[0], sizeof a);
+    ASSERT_EQ(a == b, bytes == 0);
+    ASSERT_EQ(a < b, bytes < 0);
+    ASSERT_EQ(a >= b, bytes >= 0);
   }
   Mat2 m(Real(1), Real(-2), Real(0), Real(3));
   const Real huge = Real(3.4028234663852886e+38);
@@ -156,7 +149,7 @@ TYPED_TEST(CKRMatrixTTest, InverseIsExactUpToTheConditionNumber) {
           << ::testing::PrintToString(m);
       const Matrix scaledIdentity = m * m.Adjoint();
       ASSERT_LE(KRMaxDifference(scaledIdentity, Matrix(identity * m.Determinant())),
-                4 * N * TestFixture::kEpsilon * KRMaxEntry(m) * KRMaxEntry(m.Adjoint()) * N);
+                16 * N * N * TestFixture::kEpsilon * KRMaxEntry(m) * KRMaxEntry(m.Adjoint()));
     }
     EXPECT_GT(inverted, 400);
     // Singular by the absolute threshold, singular exactly, and non-finite.
@@ -168,7 +161,10 @@ TYPED_TEST(CKRMatrixTTest, InverseIsExactUpToTheConditionNumber) {
     EXPECT_EQ(invalid.Inverse(), Matrix::ZERO);
     invalid(0, 0) = std::numeric_limits<Real>::infinity();
     EXPECT_EQ(invalid.Inverse(), Matrix::ZERO);
-    Matrix dependent = KRRandomMatrix<Matrix>(random);
+    // Small integers: the determinant is exactly 0.
+    Matrix dependent = KRRandomMatrix<Matrix>(random, 9);
+    for (int e = 0; e < N * N; ++e)
+      dependent(e / N, e % N) = std::round(dependent(e / N, e % N));
     dependent.SetRow(1, dependent.GetRow(0) * Real(2));
     EXPECT_EQ(dependent.Inverse(), Matrix::ZERO);
   });

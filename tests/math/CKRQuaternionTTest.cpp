@@ -189,7 +189,7 @@ TYPED_TEST(CKRQuaternionTTest, AlignmentAndTwistDecompositions) {
   }
   // Opposite vectors: the half turn about from turned by a right angle in
   // the plane of its z and its larger of x and y; zero vectors: IDENTITY.
-  EXPECT_EQ(TestFixture::Difference(Quat::Align(V3(1, 0, 0), V3(-1, 0, 0)), Quat(0, 0, 0, 1)), 0.0);
-  EXPECT_EQ(TestFixture::Difference(Quat::Align(V3(0, 0, 2), V3(0, 0, -2)), Quat(0, -1, 0, 0)), 0.0);
+  EXPECT_EQ(Quat::Align(V3(1, 0, 0), V3(-1, 0, 0)), Quat(0, 0, 0, 1));
+  EXPECT_EQ(Quat::Align(V3(0, 0, 2), V3(0, 0, -2)), Quat(0, -1, 0, 0));
   EXPECT_EQ(Quat::Align(V3::ZERO, V3(1, 0, 0)), Quat::IDENTITY);
 }

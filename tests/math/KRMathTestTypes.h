@@ -20,6 +20,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <iomanip>
 #include <limits>
 #include <numbers>
 #include <ostream>
@@ -76,7 +77,7 @@ void PrintTo(const Tuple<N, Real, Other>& tuple, std::ostream* out) {
 }
 template <int N, class Real, class Other>
 void PrintTo(const CKRMatrixT<N, Real, Other>& m, std::ostream* out) {
-  *out << "(";
+  *out << std::setprecision(std::numeric_limits<Real>::max_digits10) << "(";
   for (int i = 0; i < N * N; ++i)
     *out << (i == 0 ? "" : i % N == 0 ? "; " : ", ") << m(i / N, i % N);
   *out << ")";

@@ -146,12 +146,13 @@ public:
 
   // ---- interpolation ----
   // The spherical interpolation from p (t = 0) to q (t = 1) along the great
-  // circle through both, with the angle a = ACos(p . q); p when they are
-  // equal or a is below EPSILON. No sign flip is
-  // made for p . q < 0: the interpolation then takes the long way. For q =
-  // -p, where every great circle through p reaches q, it takes the one
-  // through (0, 1, 0, 0) * p = (-x, w, -z, y) (p followed by a full turn
-  // about the x axis), and the results stay unit quaternions.
+  // circle through both, with the angle a = ACos(p . q): (sin((1 - t) a) p +
+  // sin(t a) q) / sin(a); p when they are equal or a is below EPSILON. No
+  // sign flip is made for p . q < 0: the interpolation then takes the long
+  // way. For q = -p (1 + p . q within four units of rounding of 0), where
+  // every great circle through p reaches q, it takes the one through
+  // (0, 1, 0, 0) * p = (-x, w, -z, y) (p followed by a full turn about the x
+  // axis), and the results stay unit quaternions.
   static CKRQuaternionT Slerp(Real t, const CKRQuaternionT& p, const CKRQuaternionT& q) noexcept;
   // As Slerp with `spins` extra half turns of the quaternion (full turns of
   // the rotation) on the way: the phase spins * pi * t, with pi at the full
@@ -174,8 +175,9 @@ public:
   // about `from` turned by a right angle in the coordinate plane of its z
   // and the larger of its x and y (the u of
   // CKRVector3T::GenerateOrthonormalBasis): (-z, 0, x) / sqrt(x^2 + z^2)
-  // when abs(x) >= abs(y), else (0, z, -y) / sqrt(y^2 + z^2). A zero `from`
-  // gives IDENTITY.
+  // when abs(x) >= abs(y), else (0, z, -y) / sqrt(y^2 + z^2); vectors count
+  // as opposite when from + to is not longer than EPSILON. A zero (or NaN)
+  // `from` or `to` gives IDENTITY.
   static CKRQuaternionT Align(const Vector3& from, const Vector3& to) noexcept;
   static CKRQuaternionT Align(const Vector4& from, const Vector4& to) noexcept;
   // this = twist * noTwist with noTwist = Align(axis, this * axis), which
