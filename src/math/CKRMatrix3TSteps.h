@@ -62,25 +62,25 @@ void Givens(Real y, Real z, Real& c, Real& s) {
   s = r == Real(0) ? Real(0) : z / r;
 }
 
-// Columns (rows) k and l turned by (c, s): k becomes c k + s l, l becomes
-// c l - s k.
-template <class Matrix, class Real>
-void RotateColumns(Matrix& m, int k, int l, Real c, Real s) {
-  for (int r = 0; r < 3; ++r) {
-    const Real a = m(r, k);
-    const Real b = m(r, l);
-    m(r, k) = c * a + s * b;
-    m(r, l) = c * b - s * a;
+// Columns (or, with Rows, rows) k and l turned by (c, s): k becomes c k +
+// s l, l becomes c l - s k.
+template <bool Rows, class Matrix, class Real>
+void Rotate(Matrix& m, int k, int l, Real c, Real s) {
+  for (int i = 0; i < 3; ++i) {
+    Real& first = Rows ? m(k, i) : m(i, k);
+    Real& second = Rows ? m(l, i) : m(i, l);
+    const Real a = first;
+    first = c * a + s * second;
+    second = c * second - s * a;
   }
 }
 template <class Matrix, class Real>
+void RotateColumns(Matrix& m, int k, int l, Real c, Real s) {
+  Rotate<false>(m, k, l, c, s);
+}
+template <class Matrix, class Real>
 void RotateRows(Matrix& m, int k, int l, Real c, Real s) {
-  for (int column = 0; column < 3; ++column) {
-    const Real a = m(k, column);
-    const Real b = m(l, column);
-    m(k, column) = c * a + s * b;
-    m(l, column) = c * b - s * a;
-  }
+  Rotate<true>(m, k, l, c, s);
 }
 
 // The Householder reflection I - beta v v^T that maps x (its entries first..2)
@@ -106,22 +106,23 @@ bool Householder(const Real x[3], int first, Real v[3], Real& beta) {
   return true;
 }
 
-// m = (I - beta v v^T) m, and m = m (I - beta v v^T).
-template <class Matrix, class Real>
-void ReflectRows(Matrix& m, const Real v[3], Real beta) {
-  for (int column = 0; column < 3; ++column) {
-    const Real s = beta * (v[0] * m(0, column) + v[1] * m(1, column) + v[2] * m(2, column));
-    for (int r = 0; r < 3; ++r)
-      m(r, column) -= s * v[r];
+// m = (I - beta v v^T) m (with Rows) or m = m (I - beta v v^T).
+template <bool Rows, class Matrix, class Real>
+void Reflect(Matrix& m, const Real v[3], Real beta) {
+  const auto at = [&](int i, int j) -> Real& { return Rows ? m(j, i) : m(i, j); };
+  for (int i = 0; i < 3; ++i) {
+    const Real s = beta * (at(i, 0) * v[0] + at(i, 1) * v[1] + at(i, 2) * v[2]);
+    for (int j = 0; j < 3; ++j)
+      at(i, j) -= s * v[j];
   }
 }
 template <class Matrix, class Real>
+void ReflectRows(Matrix& m, const Real v[3], Real beta) {
+  Reflect<true>(m, v, beta);
+}
+template <class Matrix, class Real>
 void ReflectColumns(Matrix& m, const Real v[3], Real beta) {
-  for (int r = 0; r < 3; ++r) {
-    const Real s = beta * (m(r, 0) * v[0] + m(r, 1) * v[1] + m(r, 2) * v[2]);
-    for (int column = 0; column < 3; ++column)
-      m(r, column) -= s * v[column];
-  }
+  Reflect<false>(m, v, beta);
 }
 
 // The largest magnitude among the entries (only those on and above the

@@ -75,22 +75,28 @@ CKRMatrix4T<Real, Other> CKRMatrix4T<Real, Other>::BuildRotationMatrix(Real angl
   return rotation;
 }
 
+namespace {
+
+// IDENTITY with x, y, z of v in column `column` (rows 0..2), or on the
+// diagonal for column -1.
+template <class Real, class Other>
+CKRMatrix4T<Real, Other> IdentityWith(const CKRVector4T<Real, Other>& v, int column) {
+  CKRMatrix4T<Real, Other> m = CKRMatrix4T<Real, Other>::IDENTITY;
+  for (int i = 0; i < 3; ++i)
+    m(i, column < 0 ? i : column) = v[i];
+  return m;
+}
+
+}  // namespace
+
 template <class Real, class Other>
 CKRMatrix4T<Real, Other> CKRMatrix4T<Real, Other>::BuildTranslationMatrix(Vector4 t) noexcept {
-  CKRMatrix4T translation = IDENTITY;
-  translation(0, 3) = t.X();
-  translation(1, 3) = t.Y();
-  translation(2, 3) = t.Z();
-  return translation;
+  return IdentityWith(t, 3);
 }
 
 template <class Real, class Other>
 CKRMatrix4T<Real, Other> CKRMatrix4T<Real, Other>::BuildScalingMatrix(Vector4 s) noexcept {
-  CKRMatrix4T scaling = IDENTITY;
-  scaling(0, 0) = s.X();
-  scaling(1, 1) = s.Y();
-  scaling(2, 2) = s.Z();
-  return scaling;
+  return IdentityWith(s, -1);
 }
 
 template class CKRMatrixT<2, float, double>;
