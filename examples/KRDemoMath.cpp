@@ -1,6 +1,8 @@
-// Math: the scalar helpers, vectors and points in both precisions, and the
-// text forms of points.
+// Math: the scalar helpers, vectors and points in both precisions, the text
+// forms of points, matrices and quaternions.
 #include "KRDemo.h"
+
+#include <numbers>
 
 void KRDemoMath() {
   using Math = CKRMathT<double, float>;
@@ -63,4 +65,37 @@ void KRDemoMath() {
   CKRPoint2T<double, float> precise(0.0, 0.0);
   precise.FromString(L"5000000.123456,-0.5");
   Print(L"   a double point reads at full precision: " + precise.ToString() + L"\n");
+
+  Print(L"\n7. Matrices and quaternions: rotations, inverses and decompositions:\n");
+  using Matrix3 = CKRMatrix3T<double, float>;
+  using Quaternion = CKRQuaternionT<double, float>;
+  const double quarterTurn = std::numbers::pi / 2;
+  const Matrix3 turn(Vector(0, 0, 1), quarterTurn);
+  Print(L"   a quarter turn about z maps x to " + Vector(turn * Vector(1, 0, 0)).ToString() + L"\n");
+  Print(CKRString::Formatted(L"   by HALF_PI (pi / 2 in single precision) x becomes %.3g instead of 0\n",
+                             Vector(Matrix3(Vector(0, 0, 1), Math::HALF_PI) * Vector(1, 0, 0)).X()));
+  Matrix3 euler;
+  euler.FromEulerAnglesXYZ(0.1, quarterTurn, 0.3);
+  double x = 0, y = 0, z = 0;
+  const bool unique = euler.ToEulerAnglesXYZ(x, y, z);
+  Print(CKRString::Formatted(L"   Euler XYZ (0.1, pi/2, 0.3) back: unique %d, (%.2f, %.4f, %.2f): gimbal lock\n",
+                             int(unique), x, y, z));
+  const Matrix3 symmetric(2.0, 1.0, 0.0, 1.0, 2.0, 0.0, 0.0, 0.0, 5.0);
+  Matrix3 rot, diag;
+  symmetric.EigenDecomposition(rot, diag);
+  Print(CKRString::Formatted(L"   eigenvalues of (2 1 0; 1 2 0; 0 0 5): %g, %g, %g\n", diag(0, 0), diag(1, 1),
+                             diag(2, 2)));
+  Print(CKRString::Formatted(L"   diag(1e-3, 1e-3, 1e-3) inverts to ZERO (determinant below EPSILON): %d\n",
+                             int(Matrix3(1e-3, 1e-3, 1e-3).Inverse() == Matrix3::ZERO)));
+  const Quaternion q(turn);
+  Print(CKRString::Formatted(L"   its quaternion (w, x, y, z) = (%.6f, %g, %g, %.6f)\n", q.W(), q.X(), q.Y(), q.Z()));
+  const Quaternion half = Quaternion::Slerp(0.5, Quaternion::IDENTITY, q);
+  Vector axis;
+  double angle = 0;
+  half.ToAxisAngle(axis, angle);
+  Print(L"   half-way from the identity: " + CKRString::Formatted(L"%.6f", angle) + L" rad about " + axis.ToString() +
+        L"\n");
+  const Quaternion flip = Quaternion::Align(Vector(1, 0, 0), Vector(-1, 0, 0));
+  Print(CKRString::Formatted(L"   Align(x, -x) is the half turn (%g, %g, %g, %g)\n", flip.W(), flip.X(), flip.Y(),
+                             flip.Z()));
 }

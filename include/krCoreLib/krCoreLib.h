@@ -55,10 +55,15 @@
 
 // Math.
 #include <krCoreLib/math/CKRMathT.h>
+#include <krCoreLib/math/CKRMatrix2T.h>
+#include <krCoreLib/math/CKRMatrix3T.h>
+#include <krCoreLib/math/CKRMatrix4T.h>
+#include <krCoreLib/math/CKRMatrixT.h>
 #include <krCoreLib/math/CKRPoint2T.h>
 #include <krCoreLib/math/CKRPoint3T.h>
 #include <krCoreLib/math/CKRPoint4T.h>
 #include <krCoreLib/math/CKRPointT.h>
+#include <krCoreLib/math/CKRQuaternionT.h>
 #include <krCoreLib/math/CKRTupleT.h>
 #include <krCoreLib/math/CKRVector2T.h>
 #include <krCoreLib/math/CKRVector3T.h>
