@@ -4,6 +4,8 @@
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/objectmodel/IKRObject.h>
 
+#include "SKRInstanceTable.h"
+
 #include <algorithm>
 
 namespace {
@@ -13,6 +15,12 @@ namespace {
 constexpr int kMaxHierarchyDepth = 4096;
 
 }  // namespace
+
+CKRObjectTypeImpl::CKRObjectTypeImpl() : m_pInstances(std::make_unique<SKRInstanceTable>()) {}
+
+int CKRObjectTypeImpl::GetInstanceCount() const {
+  return static_cast<int>(m_pInstances->Size());
+}
 
 CKRObjectTypeImpl::~CKRObjectTypeImpl() {
   // A type object ends with its module. Leave nothing behind that points at
@@ -92,14 +100,11 @@ void CKRObjectTypeImpl::Release() {
     // Release may release others, which then are gone when their turn comes).
     std::vector<CKRGuid> ids;
     GetInstanceList(ids);
-    for (const CKRGuid& id : ids) {
-      const auto at = m_InstanceMap.find(id);
-      if (at == m_InstanceMap.end())
-        continue;
-      IKRObject* object = at->second;
-      m_InstanceMap.erase(at);
-      object->Release();
-    }
+    for (const CKRGuid& id : ids)
+      if (IKRObject* object = m_pInstances->Find(id)) {
+        m_pInstances->Remove(id, object);
+        object->Release();
+      }
   }
   DetachChildTypes();
   if (m_pParentType != nullptr)
@@ -158,8 +163,7 @@ int CKRObjectTypeImpl::ReleaseInstance(IKRObject* object) {
 }
 
 IKRObject* CKRObjectTypeImpl::GetInstance(CKRGuid instanceID) {
-  const auto at = m_InstanceMap.find(instanceID);
-  return at == m_InstanceMap.end() ? nullptr : at->second;
+  return m_pInstances->Find(instanceID);
 }
 
 int CKRObjectTypeImpl::AddChildType(IKRObjectType* child) {
@@ -192,8 +196,7 @@ int CKRObjectTypeImpl::IsTypeOf(CKRGuid typeID) {
 
 void CKRObjectTypeImpl::GetInstanceList(std::vector<CKRGuid>& list) {
   const std::size_t first = list.size();
-  for (const auto& [id, object] : m_InstanceMap)
-    list.push_back(id);
+  m_pInstances->ForEach([&](const CKRGuid& id, IKRObject*) { list.push_back(id); });
   std::sort(list.begin() + std::ptrdiff_t(first), list.end());
 }
 
@@ -208,16 +211,13 @@ void CKRObjectTypeImpl::GetDerivedTypes(std::vector<IKRObjectType*>& list) {
 void CKRObjectTypeImpl::RemoveTrackedInstance(IKRObject* object) {
   // Removes the entry only when it holds this very object: an untracked twin
   // with the same instance ID leaves the tracked object in place.
-  if (object == nullptr)
-    return;
-  const auto at = m_InstanceMap.find(object->GetInstanceID());
-  if (at != m_InstanceMap.end() && at->second == object)
-    m_InstanceMap.erase(at);
+  if (object != nullptr)
+    m_pInstances->Remove(object->GetInstanceID(), object);
 }
 
 void CKRObjectTypeImpl::AddTrackedInstance(IKRObject* object) {
   if (object != nullptr)
-    m_InstanceMap.try_emplace(object->GetInstanceID(), object);
+    m_pInstances->Add(object->GetInstanceID(), object);
 }
 
 void SKRObjectIdentity::SetInstanceID(IKRObject* object, CKRGuid id) {

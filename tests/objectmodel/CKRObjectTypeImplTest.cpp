@@ -1,12 +1,17 @@
 #include <krCoreLib/objectmodel/CKRObjectTypeImpl.h>
 
 #include "KRTestObjects.h"
+#include "KRTestSeed.h"
 
 #include <krCoreLib/core/CKRDebugOutput.h>
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cstdint>
+#include <iterator>
+#include <map>
+#include <random>
 
 namespace {
 
@@ -129,4 +134,46 @@ TEST(CKRObjectTypeImpl, ReleaseEndsLiveInstancesAndReportsThem) {
   EXPECT_EQ(child.GetInstanceCount(), 0);
   EXPECT_EQ(root.HasDerivedTypes(), 0);
   EXPECT_EQ(child.GetParentType(), nullptr);
+}
+
+// Many instances created and released in random order, with IDs that
+// differ only in their last bytes (they share every other bit, the hardest
+// case for a hash table): every live one is found, every released one is
+// gone, and the list stays in ascending order.
+TEST(CKRObjectTypeImpl, TracksManyInstancesCreatedAndReleasedAtRandom) {
+  const unsigned seed = KRTestSeed();
+  std::mt19937 random(seed);
+  auto* type = CKRTestItem::GetCKRTestItemType();
+  const int before = type->GetInstanceCount();
+  std::map<CKRGuid, IKRObject*> live;
+  for (int step = 0; step < 20000; ++step) {
+    if (live.empty() || random() % 3 != 0) {
+      GUID raw = CKRGuid::Literal("{7C0D2E1F-0000-4000-8000-000000000000}").GetGUID();
+      const unsigned n = random() % 4096;
+      raw.Data4[6] = std::uint8_t(n >> 8);
+      raw.Data4[7] = std::uint8_t(n);
+      const CKRGuid id(raw);
+      if (live.count(id) != 0)
+        continue;
+      IKRObject* made = type->CreateInstance(id);
+      ASSERT_NE(made, nullptr);
+      live[id] = made;
+    } else {
+      auto at = live.begin();
+      std::advance(at, random() % live.size());
+      ASSERT_EQ(at->second->Release(), 1);
+      EXPECT_EQ(type->GetInstance(at->first), nullptr);
+      live.erase(at);
+    }
+    if (step % 1000 == 0) {
+      for (const auto& [id, object] : live)
+        ASSERT_EQ(type->GetInstance(id), object) << "step " << step;
+    }
+  }
+  std::vector<CKRGuid> listed;
+  type->GetInstanceList(listed);
+  EXPECT_TRUE(std::is_sorted(listed.begin(), listed.end()));
+  EXPECT_EQ(type->GetInstanceCount(), before + int(live.size()));
+  for (const auto& [id, object] : live)
+    object->Release();
 }

@@ -17,7 +17,9 @@
 #include <krCoreLib/objectmodel/IKRObjectType.h>
 
 #include <map>
-#include <unordered_map>
+#include <memory>
+
+class SKRInstanceTable;
 
 class KRCORELIB_API CKRObjectTypeImpl : public IKRObjectType {
 public:
@@ -49,10 +51,10 @@ public:
   virtual void SetClassName(CKRString name);
 
   // Number of tracked instances.
-  int GetInstanceCount() const { return static_cast<int>(m_InstanceMap.size()); }
+  int GetInstanceCount() const;
 
 protected:
-  CKRObjectTypeImpl() = default;
+  CKRObjectTypeImpl();
   CKRObjectTypeImpl(const CKRObjectTypeImpl&) = delete;
   CKRObjectTypeImpl& operator=(const CKRObjectTypeImpl&) = delete;
 
@@ -77,10 +79,10 @@ private:
   CKRGuid m_ParentTypeID;
   CKRString m_Name;
   CKRString m_ClassName;
-  // Tracked instances by instance ID: hashed, since a type may track a
-  // great many (a document's field streams); the operations that list or
-  // release them go in ascending ID order all the same.
-  std::unordered_map<CKRGuid, IKRObject*> m_InstanceMap;
+  // Tracked instances by instance ID (hashed: a type may track a great many,
+  // a document's field streams; the operations that list or release them go
+  // in ascending ID order all the same). Owned; a private table.
+  std::unique_ptr<SKRInstanceTable> m_pInstances;
   IKRObjectType* m_pParentType = nullptr;
   std::map<CKRGuid, IKRObjectType*> m_ChildTypeMap;
 };

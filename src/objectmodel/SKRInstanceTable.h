@@ -1,0 +1,120 @@
+// SKRInstanceTable: object pointers by instance ID in one open-addressing
+// array (linear probing, at most half full), for a type's tracked instances.
+// Finding, adding and removing take constant time on average and allocate
+// only when the table grows, so creating and releasing an object costs no
+// allocation beyond the object itself once a type has seen as many live
+// instances before. Removal shifts later entries back, so lookups stay fast
+// after many removals. Not synchronised.
+#pragma once
+
+#include <krCoreLib/objectmodel/CKRGuid.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <vector>
+
+class IKRObject;
+
+class SKRInstanceTable {
+public:
+  // The object under `id`, or null.
+  IKRObject* Find(const CKRGuid& id) const {
+    if (m_Count == 0)
+      return nullptr;
+    for (std::size_t slot = Home(id);; slot = Next(slot)) {
+      const SKRSlot& entry = m_Slots[slot];
+      if (entry.m_pObject == nullptr)
+        return nullptr;
+      if (entry.m_ID == id)
+        return entry.m_pObject;
+    }
+  }
+
+  // False when `id` is taken (the first object keeps it) or `object` is null.
+  bool Add(const CKRGuid& id, IKRObject* object) {
+    if (object == nullptr || Find(id) != nullptr)
+      return false;
+    if (2 * (m_Count + 1) > m_Slots.size())
+      Grow();
+    Place(id, object);
+    ++m_Count;
+    return true;
+  }
+
+  // Removes the entry under `id` when it holds `object`: true, else false.
+  bool Remove(const CKRGuid& id, const IKRObject* object) {
+    if (m_Count == 0)
+      return false;
+    std::size_t hole = Home(id);
+    for (;; hole = Next(hole)) {
+      const SKRSlot& entry = m_Slots[hole];
+      if (entry.m_pObject == nullptr)
+        return false;
+      if (entry.m_ID == id)
+        break;
+    }
+    if (m_Slots[hole].m_pObject != object)
+      return false;
+    // Close the gap: an entry further on moves into the hole unless its
+    // home lies cyclically in (hole, next].
+    for (std::size_t next = Next(hole); m_Slots[next].m_pObject != nullptr; next = Next(next)) {
+      const std::size_t home = Home(m_Slots[next].m_ID);
+      const bool staysPut = hole <= next ? (hole < home && home <= next) : (hole < home || home <= next);
+      if (!staysPut) {
+        m_Slots[hole] = m_Slots[next];
+        hole = next;
+      }
+    }
+    m_Slots[hole] = SKRSlot();
+    --m_Count;
+    return true;
+  }
+
+  std::size_t Size() const { return m_Count; }
+
+  // Calls function(id, object) for every entry, in no particular order.
+  template <class TFunction>
+  void ForEach(TFunction&& function) const {
+    for (const SKRSlot& entry : m_Slots)
+      if (entry.m_pObject != nullptr)
+        function(entry.m_ID, entry.m_pObject);
+  }
+
+private:
+  struct SKRSlot {
+    CKRGuid m_ID;
+    IKRObject* m_pObject = nullptr;  // null: empty
+  };
+
+  // The high bits of a second multiplication: std::hash<CKRGuid> leaves
+  // IDs that differ only in their last bytes equal in their low bits.
+  std::size_t Home(const CKRGuid& id) const {
+    std::uint64_t hash = std::hash<CKRGuid>()(id);
+    hash = (hash ^ (hash >> 32)) * 0x9E3779B97F4A7C15ull;
+    return std::size_t(hash >> m_Shift);
+  }
+  std::size_t Next(std::size_t slot) const { return (slot + 1) & (m_Slots.size() - 1); }
+
+  void Place(const CKRGuid& id, IKRObject* object) {
+    std::size_t slot = Home(id);
+    while (m_Slots[slot].m_pObject != nullptr)
+      slot = Next(slot);
+    m_Slots[slot] = {id, object};
+  }
+
+  void Grow() {
+    std::vector<SKRSlot> old(m_Slots.empty() ? 16 : 2 * m_Slots.size());
+    old.swap(m_Slots);
+    m_Shift = 64;
+    for (std::size_t size = m_Slots.size(); size > 1; size >>= 1)
+      --m_Shift;
+    for (const SKRSlot& entry : old)
+      if (entry.m_pObject != nullptr)
+        Place(entry.m_ID, entry.m_pObject);
+  }
+
+  std::vector<SKRSlot> m_Slots;  // a power of two long
+  std::size_t m_Count = 0;
+  unsigned m_Shift = 64;  // 64 - log2 of the slot count
+};
