@@ -43,6 +43,11 @@
 #include <krCoreLib/serialization/IKRSerializableAdaptor.h>
 #include <krCoreLib/serialization/KRFieldTypes.h>
 
+// Application framework.
+#include <krCoreLib/framework/CKRObservable.h>
+#include <krCoreLib/framework/CKRObservation.h>
+#include <krCoreLib/framework/CKRObserver.h>
+
 // Units and engineering values.
 #include <krCoreLib/units/CKRColor.h>
 #include <krCoreLib/units/CKROptionSet.h>

@@ -1,0 +1,6 @@
+#include "KRFrameworkTestObjects.h"
+
+KR_IMPLEMENT_OBJECT_TYPE(CKRTestObservationA, CKRObservation)
+KR_IMPLEMENT_OBJECT_TYPE(CKRTestObservationB, CKRTestObservationA)
+KR_IMPLEMENT_OBJECT_TYPE(CKRTestObservable, CKRObservable)
+KR_IMPLEMENT_OBJECT_TYPE(CKRTestObserver, CKRObserver)
