@@ -4,7 +4,7 @@
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/objectmodel/IKRObject.h>
 
-#include "SKRInstanceTable.h"
+#include <krCoreLib/objectmodel/SKRGuidTableT.h>
 
 #include <algorithm>
 
@@ -16,7 +16,7 @@ constexpr int kMaxHierarchyDepth = 4096;
 
 }  // namespace
 
-CKRObjectTypeImpl::CKRObjectTypeImpl() : m_pInstances(std::make_unique<SKRInstanceTable>()) {}
+CKRObjectTypeImpl::CKRObjectTypeImpl() : m_pInstances(std::make_unique<SKRGuidTableT<IKRObject>>()) {}
 
 int CKRObjectTypeImpl::GetInstanceCount() const {
   return static_cast<int>(m_pInstances->Size());

@@ -74,11 +74,15 @@ int CKRMemoryTypeManifest::WriteTypeHeader(IKRObjectType* type) {
   return CKRTypeManifest::WriteTypeHeader(type);
 }
 
+void CKRMemoryFieldStream::SetDocument(CKRDocument* document) {
+  CKRFieldStream::SetDocument(document);
+  m_pMemoryDocument = dynamic_cast<CKRMemoryDocument*>(document);
+}
+
 SKRStoredObject* CKRMemoryFieldStream::Stored(bool create) {
   if (m_pStored != nullptr)
     return m_pStored;
-  auto* document = dynamic_cast<CKRMemoryDocument*>(GetDocument());
-  SKRStoredDocument* stored = document != nullptr ? document->Stored() : nullptr;
+  SKRStoredDocument* stored = m_pMemoryDocument != nullptr ? m_pMemoryDocument->Stored() : nullptr;
   if (stored == nullptr)
     return nullptr;
   if (create)
@@ -91,8 +95,7 @@ int CKRMemoryFieldStream::WriteObjectHeader(IKRObject* object) {
   SKRStoredObject* stored = Stored(true);
   if (stored == nullptr)
     return 1;
-  auto* document = static_cast<CKRMemoryDocument*>(GetDocument());
-  if (document->m_pMedium->m_RefuseSecondHeader && stored->m_HeaderWrites > 0)
+  if (m_pMemoryDocument->m_pMedium->m_RefuseSecondHeader && stored->m_HeaderWrites > 0)
     return 0;
   ++stored->m_HeaderWrites;
   stored->m_TypeID = object->GetType()->GetID();
@@ -101,8 +104,8 @@ int CKRMemoryFieldStream::WriteObjectHeader(IKRObject* object) {
 
 int CKRMemoryFieldStream::Write(IKRFieldData* fieldData) {
   const CKRGuid fieldID = FieldIDOf(fieldData);
-  auto* document = dynamic_cast<CKRMemoryDocument*>(GetDocument());
-  if (document != nullptr && document->m_pMedium != nullptr && fieldID == document->m_pMedium->m_FailWriteOfField)
+  const SKRStoredMedium* medium = m_pMemoryDocument != nullptr ? m_pMemoryDocument->m_pMedium : nullptr;
+  if (medium != nullptr && medium->m_FailWriteOfField.IsValid() && fieldID == medium->m_FailWriteOfField)
     return 0;
   if (SKRStoredObject* stored = Stored(true)) {
     stored->m_Values[fieldID] = fieldData->GetStringValue();

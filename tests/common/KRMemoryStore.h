@@ -85,6 +85,7 @@ class CKRMemoryFieldStream : public CKRFieldStream {
   KR_DECLARE_OBJECT_TYPE(CKRMemoryFieldStream, CKRObjectTypeImpl, "{6D3C0E2A-1111-4B7A-9C1D-00000000A004}")
 
 public:
+  void SetDocument(CKRDocument* document) override;
   int WriteObjectHeader(IKRObject* object) override;
   int Write(IKRFieldData* fieldData) override;
   int ReadObjectHeader(IKRObject* object) override;
@@ -104,4 +105,5 @@ private:
   std::vector<SKRStoredLink>* StoredLinks(IKRFieldData* fieldData);
 
   SKRStoredObject* m_pStored = nullptr;  // found once (elements of the medium do not move)
+  CKRMemoryDocument* m_pMemoryDocument = nullptr;
 };

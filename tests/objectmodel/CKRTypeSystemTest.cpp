@@ -52,9 +52,15 @@ TEST_F(CKRTypeSystemTest, InitializeLinksEveryTypeBeforeInitialisingAny) {
   const Types expected = {&root, &child, &leaf, CKRObjectImpl::GetCKRObjectImplType()};
   EXPECT_EQ(Walk(CKRTypeSystem::GetRepositoryIterator(kHostRepository)), expected);
   EXPECT_EQ(Walk(CKRTypeSystem::GetGlobalIterator()), expected);
-  CKRGuid firstID;
-  EXPECT_EQ(CKRTypeSystem::GetGlobalIterator().Next(1, &firstID), &root);
-  EXPECT_EQ(firstID, kRootID);
+  // The iterator hands out each type with its ID, in ascending ID order.
+  CKRTypeIterator all = CKRTypeSystem::GetGlobalIterator();
+  CKRGuid id;
+  CKRGuid previous;
+  for (IKRObjectType* type = all.Next(1, &id); type != nullptr; type = all.Next(0, &id)) {
+    EXPECT_EQ(type->GetID(), id);
+    EXPECT_TRUE(previous < id);
+    previous = id;
+  }
 }
 
 TEST_F(CKRTypeSystemTest, DuplicateTypeIDsKeepTheFirstType) {

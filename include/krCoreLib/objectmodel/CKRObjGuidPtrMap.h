@@ -13,10 +13,10 @@
 #pragma once
 
 #include <krCoreLib/objectmodel/IKRCollection.h>
+#include <krCoreLib/objectmodel/SKRGuidTableT.h>
 
 #include <map>
 #include <type_traits>
-#include <unordered_map>
 
 template <class T>
 class CKRObjGuidPtrMap : public IKRCollection {
@@ -48,17 +48,14 @@ public:
 
   int GetCount() const override { return static_cast<int>(m_Map.size()); }
 
-  T* Find(CKRGuid instanceID) override {
-    const auto at = m_Index.find(instanceID);
-    return at == m_Index.end() ? nullptr : at->second;
-  }
+  T* Find(CKRGuid instanceID) override { return m_Index.Find(instanceID); }
 
   // With `release` false, empties the map. With `release` true, takes the
   // entries in ascending ID order, erasing each before releasing its element.
   void RemoveAll(bool release) override {
     if (!release) {
       m_Map.clear();
-      m_Index.clear();
+      m_Index = SKRGuidTableT<T>();
       return;
     }
     while (!m_Map.empty()) {
@@ -66,7 +63,7 @@ public:
       T* element = first->second;
       if (element == nullptr)
         break;
-      m_Index.erase(first->first);
+      m_Index.Remove(first->first, element);
       m_Map.erase(first);
       element->Release();
     }
@@ -81,7 +78,7 @@ public:
     if (typed == nullptr)
       return 0;
     const CKRGuid id = element->GetInstanceID();
-    if (!m_Index.try_emplace(id, typed).second)
+    if (!m_Index.Add(id, typed))
       return 0;
     m_Map.emplace(id, typed);
     return 1;
@@ -93,12 +90,12 @@ public:
   T* Remove(IKRObject* element) override {
     if (element == nullptr)
       return nullptr;
-    const auto at = m_Index.find(element->GetInstanceID());
-    if (at == m_Index.end() || static_cast<IKRObject*>(at->second) != element)
+    const CKRGuid id = element->GetInstanceID();
+    T* removed = m_Index.Find(id);
+    if (removed == nullptr || static_cast<IKRObject*>(removed) != element)
       return nullptr;
-    T* removed = at->second;
-    m_Map.erase(at->first);
-    m_Index.erase(at);
+    m_Index.Remove(id, removed);
+    m_Map.erase(id);
     return removed;
   }
 
@@ -111,7 +108,7 @@ public:
 private:
   Map m_Map;
   // The same entries, for Find.
-  std::unordered_map<CKRGuid, T*> m_Index;
+  SKRGuidTableT<T> m_Index;
 };
 
 extern template class KRCORELIB_API CKRObjGuidPtrMap<IKRObject>;

@@ -19,7 +19,8 @@
 #include <map>
 #include <memory>
 
-class SKRInstanceTable;
+template <class T>
+class SKRGuidTableT;
 
 class KRCORELIB_API CKRObjectTypeImpl : public IKRObjectType {
 public:
@@ -82,7 +83,7 @@ private:
   // Tracked instances by instance ID (hashed: a type may track a great many,
   // a document's field streams; the operations that list or release them go
   // in ascending ID order all the same). Owned; a private table.
-  std::unique_ptr<SKRInstanceTable> m_pInstances;
+  std::unique_ptr<SKRGuidTableT<IKRObject>> m_pInstances;
   IKRObjectType* m_pParentType = nullptr;
   std::map<CKRGuid, IKRObjectType*> m_ChildTypeMap;
 };

@@ -1,10 +1,10 @@
-// SKRInstanceTable: object pointers by instance ID in one open-addressing
-// array (linear probing, at most half full), for a type's tracked instances.
-// Finding, adding and removing take constant time on average and allocate
-// only when the table grows, so creating and releasing an object costs no
-// allocation beyond the object itself once a type has seen as many live
-// instances before. Removal shifts later entries back, so lookups stay fast
-// after many removals. Not synchronised.
+// SKRGuidTableT: pointers to T by CKRGuid in one open-addressing array
+// (linear probing, at most half full): the index of a type's tracked
+// instances and of CKRObjGuidPtrMap. Finding, adding and removing take
+// constant time on average and allocate only when the table grows, so
+// adding and removing entries costs no allocation once the table has held
+// as many before. Removal shifts later entries back, so lookups stay fast
+// after many removals. Entries are unordered. Not synchronised.
 #pragma once
 
 #include <krCoreLib/objectmodel/CKRGuid.h>
@@ -14,12 +14,11 @@
 #include <functional>
 #include <vector>
 
-class IKRObject;
-
-class SKRInstanceTable {
+template <class T>
+class SKRGuidTableT {
 public:
   // The object under `id`, or null.
-  IKRObject* Find(const CKRGuid& id) const {
+  T* Find(const CKRGuid& id) const {
     if (m_Count == 0)
       return nullptr;
     for (std::size_t slot = Home(id);; slot = Next(slot)) {
@@ -32,7 +31,7 @@ public:
   }
 
   // False when `id` is taken (the first object keeps it) or `object` is null.
-  bool Add(const CKRGuid& id, IKRObject* object) {
+  bool Add(const CKRGuid& id, T* object) {
     if (object == nullptr || Find(id) != nullptr)
       return false;
     if (2 * (m_Count + 1) > m_Slots.size())
@@ -43,7 +42,7 @@ public:
   }
 
   // Removes the entry under `id` when it holds `object`: true, else false.
-  bool Remove(const CKRGuid& id, const IKRObject* object) {
+  bool Remove(const CKRGuid& id, const T* object) {
     if (m_Count == 0)
       return false;
     std::size_t hole = Home(id);
@@ -84,7 +83,7 @@ public:
 private:
   struct SKRSlot {
     CKRGuid m_ID;
-    IKRObject* m_pObject = nullptr;  // null: empty
+    T* m_pObject = nullptr;  // null: empty
   };
 
   // The high bits of a second multiplication: std::hash<CKRGuid> leaves
@@ -96,7 +95,7 @@ private:
   }
   std::size_t Next(std::size_t slot) const { return (slot + 1) & (m_Slots.size() - 1); }
 
-  void Place(const CKRGuid& id, IKRObject* object) {
+  void Place(const CKRGuid& id, T* object) {
     std::size_t slot = Home(id);
     while (m_Slots[slot].m_pObject != nullptr)
       slot = Next(slot);
