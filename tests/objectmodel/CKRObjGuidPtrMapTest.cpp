@@ -1,10 +1,13 @@
 #include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
 
 #include "KRTestObjects.h"
+#include "KRTestSeed.h"
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <map>
+#include <random>
 #include <vector>
 
 TEST(CKRObjGuidPtrMap, KeysElementsByInstanceID) {
@@ -54,4 +57,55 @@ TEST(CKRObjGuidPtrMap, WalksAndReleasesInAscendingIDOrder) {
   EXPECT_EQ(order, items);
   EXPECT_EQ(map.GetCount(), 0);
   EXPECT_EQ(CKRTestItem::s_Destroyed, destroyedBefore + 5);
+}
+
+// Random additions and removals against an ordered map, with walks that
+// run while elements come and go: every walk returns exactly the elements
+// present, in ascending ID order, going on after its own element left.
+TEST(CKRObjGuidPtrMap, RandomEditsKeepOrderDuringWalks) {
+  std::mt19937 random(KRTestSeed());
+  std::vector<CKRTestItem*> pool;
+  for (int i = 0; i < 400; ++i)
+    pool.push_back(NewTestItem());
+  CKRObjGuidPtrMap<CKRTestItem> map;
+  std::map<CKRGuid, CKRTestItem*> model;
+  auto edit = [&] {
+    CKRTestItem* item = pool[random() % pool.size()];
+    if (random() % 2 == 0) {
+      EXPECT_EQ(map.Add(item), model.count(item->GetInstanceID()) ? 0 : 1);
+      model.emplace(item->GetInstanceID(), item);
+    } else {
+      EXPECT_EQ(map.Remove(item), model.count(item->GetInstanceID()) ? item : nullptr);
+      model.erase(item->GetInstanceID());
+    }
+  };
+  for (int round = 0; round < 60; ++round) {
+    for (int i = 0; i < 50; ++i)
+      edit();
+    ASSERT_EQ(map.GetCount(), int(model.size()));
+    std::vector<CKRTestItem*> walked;
+    for (const auto& [id, item] : map)
+      walked.push_back(item);
+    std::vector<CKRTestItem*> expected;
+    for (const auto& [id, item] : model)
+      expected.push_back(item);
+    ASSERT_EQ(walked, expected) << "round " << round;
+    // A walk with edits between its steps returns ascending IDs, each
+    // present when it is returned.
+    auto it = map.GetIterator();
+    CKRGuid last;
+    bool started = false;
+    for (CKRTestItem* item = it.Next(1); item != nullptr; item = it.Next(0)) {
+      ASSERT_EQ(map.Find(item->GetInstanceID()), item);
+      if (started) {
+        ASSERT_TRUE(last < item->GetInstanceID());
+      }
+      last = item->GetInstanceID();
+      started = true;
+      edit();
+    }
+  }
+  map.RemoveAll(false);
+  for (CKRTestItem* item : pool)
+    item->Release();
 }
