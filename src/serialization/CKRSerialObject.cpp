@@ -36,6 +36,8 @@ void CKRSerialObject::AddFieldData(IKRFieldData* fieldData) {
 void CKRSerialObject::InitFieldData() {
   // The object's own type (GetType is the concrete class's), so that a
   // storable class need not override this to bind its fields.
-  if (auto* type = dynamic_cast<CKRSerialObjectTypeImpl*>(GetType()))
+  if (auto* type = dynamic_cast<CKRSerialObjectTypeImpl*>(GetType())) {
+    ReserveFieldData(type->GetFieldMap().size());
     type->CreateFields(type, this);
+  }
 }

@@ -19,6 +19,7 @@
 
 #include <krCoreLib/serialization/IKRSerializable.h>
 
+#include <cstddef>
 #include <vector>
 
 class IKRObject;
@@ -67,6 +68,9 @@ protected:
   IKRSerializableAdaptor& operator=(const IKRSerializableAdaptor&) = delete;
   // Releases the field data still held.
   virtual ~IKRSerializableAdaptor();
+
+  // Room for `count` field data, so that binding them allocates once.
+  void ReserveFieldData(std::size_t count) { m_FieldDataList.reserve(count); }
 
 private:
   friend class CKRDocument;
