@@ -76,6 +76,7 @@
 #include <krCoreLib/math/CKRVectorT.h>
 
 // Geometry.
+#include <krCoreLib/geometry/CKRBoundT.h>
 #include <krCoreLib/geometry/KRAdaptiveOrient2d.h>
 #include <krCoreLib/geometry/KRSweepElements.h>
 #include <krCoreLib/geometry/KRSweepPolygon.h>
