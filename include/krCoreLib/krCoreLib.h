@@ -76,6 +76,15 @@
 #include <krCoreLib/math/CKRVectorT.h>
 
 // Geometry.
+#include <krCoreLib/geometry/CKRBoundT.h>
+#include <krCoreLib/geometry/CKRDistanceT.h>
+#include <krCoreLib/geometry/CKRLineT.h>
+#include <krCoreLib/geometry/CKRPlanarPolygonT.h>
+#include <krCoreLib/geometry/CKRPolyLineT.h>
+#include <krCoreLib/geometry/CKRPolygonT.h>
+#include <krCoreLib/geometry/CKRTriangleT.h>
+#include <krCoreLib/geometry/CKRVertexSequenceT.h>
+#include <krCoreLib/geometry/CKRVertexSourceT.h>
 #include <krCoreLib/geometry/KRAdaptiveOrient2d.h>
 #include <krCoreLib/geometry/KRSweepElements.h>
 #include <krCoreLib/geometry/KRSweepPolygon.h>
