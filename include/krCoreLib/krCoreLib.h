@@ -47,6 +47,12 @@
 #include <krCoreLib/framework/CKRObservable.h>
 #include <krCoreLib/framework/CKRObservation.h>
 #include <krCoreLib/framework/CKRObserver.h>
+#include <krCoreLib/framework/CKRModel.h>
+#include <krCoreLib/framework/CKRTool.h>
+#include <krCoreLib/framework/CKRToolEvent.h>
+
+// User interface: the document window as a host of tools.
+#include <krCoreLib/ui/CKRMDIChildWnd.h>
 
 // Units and engineering values.
 #include <krCoreLib/units/CKRColor.h>

@@ -1,0 +1,3 @@
+#include <krCoreLib/platform/KRWindowTypes.h>
+
+CKRWnd::~CKRWnd() = default;
