@@ -8,6 +8,8 @@ int main() {
   KRDemoObjectModel();
   PrintSection(L"Fields and storable objects");
   KRDemoSerialization();
+  PrintSection(L"Graphs, walks and preferences");
+  KRDemoFramework();
   PrintSection(L"Units and engineering values");
   KRDemoUnits();
   PrintSection(L"Math in two precisions");
