@@ -3,7 +3,6 @@
 // loaded back (directed edges, cycles, derived classes), then torn down
 // node by node.
 #include <krCoreLib/framework/CKRGraphNode.h>
-#include <krCoreLib/serialization/IKRField.h>
 
 #include "KRFrameworkStore.h"
 #include "KRGraphTestObjects.h"
@@ -229,32 +228,15 @@ TEST(CKRGraphNode, ReleasingANodeReleasesItsEdgesAndTheirOtherEndsForgetThem) {
 // links, then the node's edge list, with their IDs, data types and flags.
 TEST(CKRGraphNode, StoredFieldsAreTheNodeLinksAndTheEdgeList) {
   CKRFrameworkStore store;
-  struct SKRExpected {
-    CKRSerialObjectTypeImpl* m_pType;
-    CKRGuid m_FieldID;
-    const wchar_t* m_Name;
-    CKRGuid m_DataType;
-    int m_Flags;
-  };
-  const SKRExpected expected[] = {
+  const std::vector<SKRExpectedField> expected = {
       {CKRGraphEdge::GetCKRGraphEdgeType(), CKRGuid::Literal("{1212F592-7438-407D-8ACB-7A5E5B7AC239}"),
-       L"m_pPrimaryNode", KRDT_OBJECT_LINK, 0x427},
+       L"m_pPrimaryNode", L"m_pPrimaryNode", KRDT_OBJECT_LINK, 0x427},
       {CKRGraphEdge::GetCKRGraphEdgeType(), CKRGuid::Literal("{6DAE28D0-BFB9-4421-B142-F5671EF3A55A}"),
-       L"m_pSecondaryNode", KRDT_OBJECT_LINK, 0x427},
+       L"m_pSecondaryNode", L"m_pSecondaryNode", KRDT_OBJECT_LINK, 0x427},
       {CKRGraphNode::GetCKRGraphNodeType(), CKRGuid::Literal("{BC46ABAF-175D-4139-9B08-1B063477ADDE}"), L"m_EdgeList",
-       KRDT_OBJECT_COLLECTION, 0x447},
+       L"m_EdgeList", KRDT_OBJECT_COLLECTION, 0x447},
   };
-  for (const SKRExpected& field : expected) {
-    SCOPED_TRACE(field.m_Name);
-    IKRField* descriptor = field.m_pType->GetField(field.m_FieldID);
-    ASSERT_NE(descriptor, nullptr);
-    EXPECT_EQ(descriptor->GetName(), field.m_Name);
-    EXPECT_EQ(descriptor->GetDescription(), field.m_Name);
-    EXPECT_EQ(descriptor->GetDataTypeID(), field.m_DataType);
-    EXPECT_EQ(descriptor->GetFlags(), field.m_Flags);
-    EXPECT_EQ(descriptor->GetOriginType(), field.m_pType);
-    EXPECT_EQ(descriptor->GetVersion(), 0.0);
-  }
+  ExpectFields(expected);
 
   CKRTestPlace* a = NewPlace(L"A");
   CKRTestPlace* b = NewPlace(L"B");

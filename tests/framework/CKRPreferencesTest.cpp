@@ -4,7 +4,6 @@
 // section twice.
 #include <krCoreLib/framework/CKRPreferences.h>
 #include <krCoreLib/serialization/CKRFieldT.h>
-#include <krCoreLib/serialization/IKRField.h>
 
 #include "KRFrameworkStore.h"
 #include "KRTestSeed.h"
@@ -55,15 +54,7 @@ void CKRTestUnitsSection::CKRTestUnitsSectionType::CreateFields(CKRSerialObjectT
 
 TEST(CKRPreferences, FieldsAndNewObjects) {
   CKRFrameworkStore types;
-  struct SKRExpected {
-    CKRSerialObjectTypeImpl* m_pType;
-    CKRGuid m_FieldID;
-    const wchar_t* m_Name;
-    const wchar_t* m_Description;
-    CKRGuid m_DataType;
-    int m_Flags;
-  };
-  const SKRExpected expected[] = {
+  const std::vector<SKRExpectedField> expected = {
       {CKRPreferences::GetCKRPreferencesType(), kSectionMapField, L"m_PreferenceSectionMap", L"m_PreferenceSectionMap",
        KRDT_OBJECT_COLLECTION, 0x447},
       {CKRPreferenceSection::GetCKRPreferenceSectionType(), CKRGuid::Literal("{FCB6CEF7-3A8C-4CD8-A1F8-77DDCFF0C92E}"),
@@ -71,16 +62,7 @@ TEST(CKRPreferences, FieldsAndNewObjects) {
       {CKRPreferenceSection::GetCKRPreferenceSectionType(), CKRGuid::Literal("{4BE98F65-D593-4411-8A56-F0E62A554F5C}"),
        L"Description", L"The description of this Preference Section", KRDT_STRING, 0x407},
   };
-  for (const SKRExpected& field : expected) {
-    SCOPED_TRACE(field.m_Name);
-    IKRField* descriptor = field.m_pType->GetField(field.m_FieldID);
-    ASSERT_NE(descriptor, nullptr);
-    EXPECT_EQ(descriptor->GetName(), field.m_Name);
-    EXPECT_EQ(descriptor->GetDescription(), field.m_Description);
-    EXPECT_EQ(descriptor->GetDataTypeID(), field.m_DataType);
-    EXPECT_EQ(descriptor->GetFlags(), field.m_Flags);
-    EXPECT_EQ(descriptor->GetOriginType(), field.m_pType);
-  }
+  ExpectFields(expected);
   // A derived section shares the base's fields, after them its own.
   EXPECT_EQ(CKRTestUnitsSection::GetCKRTestUnitsSectionType()->GetField(expected[1].m_FieldID),
             CKRPreferenceSection::GetCKRPreferenceSectionType()->GetField(expected[1].m_FieldID));

@@ -5,9 +5,39 @@
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/serialization/CKRSerialObject.h>
 
+#include <krCoreLib/serialization/IKRField.h>
+
 #include "KRMemoryStore.h"
 
+#include <gtest/gtest.h>
+
 #include <vector>
+
+// A field descriptor as stored archives know it: its type, ID, name,
+// description, data type and flags; its version is 0.0 and its origin the
+// type that declares it.
+struct SKRExpectedField {
+  CKRSerialObjectTypeImpl* m_pType;
+  CKRGuid m_FieldID;
+  const wchar_t* m_Name;
+  const wchar_t* m_Description;
+  CKRGuid m_DataType;
+  int m_Flags;
+};
+
+inline void ExpectFields(const std::vector<SKRExpectedField>& fields) {
+  for (const SKRExpectedField& field : fields) {
+    SCOPED_TRACE(field.m_Name);
+    IKRField* descriptor = field.m_pType->GetField(field.m_FieldID);
+    ASSERT_NE(descriptor, nullptr);
+    EXPECT_EQ(descriptor->GetName(), field.m_Name);
+    EXPECT_EQ(descriptor->GetDescription(), field.m_Description);
+    EXPECT_EQ(descriptor->GetDataTypeID(), field.m_DataType);
+    EXPECT_EQ(descriptor->GetFlags(), field.m_Flags);
+    EXPECT_EQ(descriptor->GetOriginType(), field.m_pType);
+    EXPECT_EQ(descriptor->GetVersion(), 0.0);
+  }
+}
 
 class CKRFrameworkStore {
 public:
