@@ -4,6 +4,7 @@
 // that skip 0; a chain of 100,000 nodes on a default stack.
 #include <krCoreLib/framework/CKRGraphNodeVisitor.h>
 
+#include "KRFrameworkStore.h"
 #include "KRGraphTestObjects.h"
 #include "KRTestSeed.h"
 
@@ -179,7 +180,8 @@ TEST(CKRGraphNodeVisitorImpl, SessionIDsSkipZeroWhenTheyWrap) {
 
 // A chain of 100,000 nodes walked from its head on a thread with the
 // default stack: collected in order with one override call per node,
-// filtered, then released with its edges.
+// filtered, then released with its edges; the same chain stored and loaded
+// is released by a walk as well.
 TEST(CKRDFSVisitor, WalksAHundredThousandNodeChainOnADefaultStack) {
   constexpr int kLength = 100000;
   std::vector<CKRTestPlace*> chain;
@@ -194,7 +196,16 @@ TEST(CKRDFSVisitor, WalksAHundredThousandNodeChainOnADefaultStack) {
   filtered->AddSeekType(CKRTestTown::TypeID);
   auto* releaser = NewObject<CKRReleaseVisitor>(CKRReleaseVisitor::GetCKRReleaseVisitorType());
   const std::size_t aliveBefore = KRLiveGraphObjects().size();
+  CKRFrameworkStore store;
   int walked = 0;
+  std::thread([&] {
+    CKRGraphNode* loaded = nullptr;
+    if (store.Save({chain[0]}) != 0)
+      loaded = store.Load<CKRGraphNode>(chain[0]->GetInstanceID(), CKRTestPlace::TypeID);
+    walked = releaser->Start(loaded);
+  }).join();
+  EXPECT_EQ(walked, 1);
+  EXPECT_EQ(KRLiveGraphObjects().size(), aliveBefore);
   std::thread([&] { walked = tracer->Start(chain[0]) + filtered->Start(chain[0]) + releaser->Start(chain[0]); }).join();
   EXPECT_EQ(walked, 3);
   EXPECT_EQ(tracer->m_Calls, long(kLength));
