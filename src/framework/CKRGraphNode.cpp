@@ -47,16 +47,19 @@ int CKRGraphEdge::OnBeforeRelease() {
   return CKRSerialObject::OnBeforeRelease();
 }
 
-bool CKRGraphEdge::IsConnected() {
-  if (m_iConnected != 0)
-    return true;
-  // The flag is not stored. Only Connect and loading enter an edge in a
-  // node's list, so an unflagged edge that both of its distinct nodes list
-  // was loaded joined: it counts as connected from now on.
-  if (m_pPrimaryNode != nullptr && m_pSecondaryNode != nullptr && m_pPrimaryNode != m_pSecondaryNode &&
-      m_pPrimaryNode->ListsEdge(this) && m_pSecondaryNode->ListsEdge(this))
+void CKRGraphEdge::OnAfterLoad(CKRDocument* document) {
+  JoinIfListed();
+  CKRSerialObject::OnAfterLoad(document);
+}
+
+void CKRGraphEdge::JoinIfListed() {
+  // The flag is not stored. An edge is loaded with its node links and
+  // listed by the nodes as they are loaded, in any order; the edge and each
+  // node try this when they are complete, so the last of them sets the
+  // flag. Everything loaded is alive while loading runs.
+  if (m_iConnected == 0 && m_pPrimaryNode != nullptr && m_pSecondaryNode != nullptr &&
+      m_pPrimaryNode != m_pSecondaryNode && m_pPrimaryNode->ListsEdge(this) && m_pSecondaryNode->ListsEdge(this))
     m_iConnected = 1;
-  return m_iConnected != 0;
 }
 
 int CKRGraphEdge::SetNodes(CKRGraphNode* primary, CKRGraphNode* secondary) {
@@ -94,7 +97,7 @@ CKRGraphNode* CKRGraphEdge::GetSecondary() {
 }
 
 int CKRGraphEdge::SwapNodes() {
-  if (!IsConnected())
+  if (m_iConnected == 0)
     return 0;
   std::swap(m_pPrimaryNode, m_pSecondaryNode);
   return 1;
@@ -151,6 +154,12 @@ void CKRGraphNode::CKRGraphNodeType::CreateFields(CKRSerialObjectTypeImpl* targe
 int CKRGraphNode::OnBeforeRelease() {
   Disconnect();
   return CKRSerialObject::OnBeforeRelease();
+}
+
+void CKRGraphNode::OnAfterLoad(CKRDocument* document) {
+  for (CKRGraphEdge* edge : m_EdgeList)
+    edge->JoinIfListed();
+  CKRSerialObject::OnAfterLoad(document);
 }
 
 CKRGraphNode::EdgeList::Iterator CKRGraphNode::GetEdgeIterator() {

@@ -209,3 +209,29 @@ TEST(CKRGraphNode, LoadedGraphsKeepTheirShapeAndReleaseCleanly) {
   }
   ReleaseComponent(original);
 }
+
+// A stored edge that only one of its nodes lists loads unconnected: the
+// other node's release leaves it alone, and releasing the listing node
+// releases it without reaching for the released one.
+TEST(CKRGraphNode, HalfListedStoredEdgeLoadsUnconnected) {
+  CKRFrameworkStore store;
+  CKRTestPlace* a = NewPlace(L"A");
+  CKRTestPlace* b = NewPlace(L"B");
+  CKRTestRoad* ab = NewRoad(a, b);
+  ASSERT_EQ(store.Save({a}), 1);
+  store.Stored().m_Objects.at(b->GetInstanceID()).m_Links.begin()->second.clear();
+  auto* loadedA = store.Load<CKRGraphNode>(a->GetInstanceID(), CKRTestPlace::TypeID);
+  ASSERT_NE(loadedA, nullptr);
+  CKRGraphEdge* loadedEdge = loadedA->GetEdge(0);
+  ASSERT_NE(loadedEdge, nullptr);
+  EXPECT_FALSE(loadedEdge->IsConnected());
+  CKRGraphNode* loadedB = loadedEdge->GetSecondary();
+  ASSERT_NE(loadedB, nullptr);
+  EXPECT_EQ(loadedB->GetEdgeCollection()->GetCount(), 0);
+  EXPECT_EQ(loadedB->Release(), 1);
+  EXPECT_EQ(loadedA->Release(), 1);
+  EXPECT_FALSE(IsAlive(loadedEdge));
+  ab->Release();
+  a->Release();
+  b->Release();
+}

@@ -10,10 +10,11 @@
 // Both classes are storable (CKRSerialObject): an edge stores its two node
 // links, a node its edge list, so storing any node or edge stores the whole
 // connected part of the graph. The connected flag and the direction are not
-// stored. A loaded edge that both of its (distinct) nodes list counts as
-// connected, exactly as if Connect had joined it: releasing it, or either
-// node, leaves no node listing it. The direction of a loaded edge is what
-// its class sets in OnInitialize.
+// stored. A loaded edge that both of its (distinct) nodes list is connected
+// once the edge and both nodes are loaded, exactly as if Connect had joined
+// it: releasing it, or either node, leaves no node listing it. A loaded
+// edge that only one of its nodes lists stays unconnected. The direction
+// of a loaded edge is what its class sets in OnInitialize.
 //
 // Visit marks (the session ID of the last walk that reached the object,
 // CKRGraphNodeVisitorImpl) live on the nodes and edges themselves. Nodes
@@ -76,10 +77,12 @@ public:
   // A connected edge disconnects first and refuses the release (0) when
   // that reports a failure; then the base's answer.
   int OnBeforeRelease() override;
+  // Connected when both nodes list the edge; then the base's hook.
+  void OnAfterLoad(CKRDocument* document) override;
 
   // True after a successful Connect, and for a loaded edge that both of
   // its nodes list.
-  bool IsConnected();
+  bool IsConnected() const { return m_iConnected != 0; }
   std::uint16_t GetDirection() const { return m_iDirection; }
 
 protected:
@@ -91,6 +94,11 @@ protected:
   bool SetDirection(std::uint16_t direction);
 
 private:
+  friend class CKRGraphNode;
+  // Sets the connected flag when the edge joins two distinct nodes that
+  // both list it (only Connect and loading enter an edge in a list).
+  void JoinIfListed();
+
   std::int32_t m_iConnected = 0;
   std::uint16_t m_iVisitMark = 0;
   CKRGraphNode* m_pPrimaryNode = nullptr;
@@ -126,6 +134,9 @@ public:
 
   // Releases the edges (Disconnect), then answers as the base.
   int OnBeforeRelease() override;
+  // Connects the listed edges that both of their nodes list; then the
+  // base's hook.
+  void OnAfterLoad(CKRDocument* document) override;
 
 protected:
   CKRGraphNode() = default;
