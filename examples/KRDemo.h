@@ -19,6 +19,7 @@ inline void PrintSection(const wchar_t* title) {
 void KRDemoObjectModel();
 void KRDemoSerialization();
 void KRDemoFramework();
+void KRDemoTools();
 void KRDemoUnits();
 void KRDemoMath();
 void KRDemoGeometry();

@@ -1,116 +1,151 @@
-// Application framework: a model that tells its two views about changes, and
-// a document window whose active tool receives a few synthesised pointer and
-// key events through the window's router.
+// Application framework: a small road map as a graph with a one-way street,
+// walked depth-first, filtered by node class and torn down by a release
+// walk; and a preferences object with two sections, one of the host's own
+// class.
 #include "KRDemo.h"
 
 namespace {
 constexpr CKRGuid kRepository = CKRGuid::Literal("{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B00}");
 }  // namespace
 
-// A change of the demo's drawing: what was added.
-class CKRDemoChange : public CKRObservation {
-  KR_DECLARE_OBJECT_TYPE(CKRDemoChange, CKRObjectTypeImpl, "{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B01}")
-public:
-  CKRString m_What;
-};
-KR_IMPLEMENT_OBJECT_TYPE(CKRDemoChange, CKRObservation)
-
-// A view that prints the changes it hears under its own name.
-class CKRDemoView : public CKRView {
-  KR_DECLARE_OBJECT_TYPE(CKRDemoView, CKRObjectTypeImpl, "{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B02}")
+// A junction with a name, and a kind of junction that is a roundabout.
+class CKRDemoJunction : public CKRGraphNode {
+  KR_DECLARE_SERIAL_TYPE(CKRDemoJunction, CKRSerialObjectTypeImpl, "{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B01}")
 public:
   CKRString m_Name;
-  void OnUpdate(CKRObservation* observation) override {
-    if (auto* change = dynamic_cast<CKRDemoChange*>(observation))
-      Print(CKRString::Formatted(L"  %s view shows: %s\n", m_Name.c_str(), change->m_What.c_str()));
-  }
 };
-KR_IMPLEMENT_OBJECT_TYPE(CKRDemoView, CKRView)
+KR_IMPLEMENT_SERIAL_TYPE(CKRDemoJunction, CKRGraphNode)
 
-// A line tool: a press starts a line, a release ends it and tells the model;
-// Escape cancels.
-class CKRDemoLineTool : public CKRTool {
-  KR_DECLARE_SERIAL_TYPE(CKRDemoLineTool, CKRSerialObjectTypeImpl, "{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B03}")
+class CKRDemoRoundabout : public CKRDemoJunction {
+  KR_DECLARE_SERIAL_TYPE(CKRDemoRoundabout, CKRSerialObjectTypeImpl, "{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B02}")
+};
+KR_IMPLEMENT_SERIAL_TYPE(CKRDemoRoundabout, CKRDemoJunction)
+
+// A street followed only from its primary to its secondary junction.
+class CKRDemoOneWayStreet : public CKRGraphEdge {
+  KR_DECLARE_SERIAL_TYPE(CKRDemoOneWayStreet, CKRSerialObjectTypeImpl, "{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B03}")
 public:
-  CKRModel* m_pModel = nullptr;
-
-  void OnMouseDown(int, unsigned int, CKRScreenPoint point, const WorldPoint& world) override {
-    m_Start = world;
-    m_Drawing = true;
-    Print(CKRString::Formatted(L"  tool: press at pixel (%d, %d), world (%g, %g)\n", point.x, point.y, world[0], world[1]));
+  int OnInitialize() override {
+    return CKRGraphEdge::OnInitialize() != 0 && SetDirection(KR_EDGE_PRIMARY_TO_SECONDARY) ? 1 : 0;
   }
-  void OnMouseUp(int, unsigned int, CKRScreenPoint, const WorldPoint& world) override {
-    if (!m_Drawing)
-      return;
-    m_Drawing = false;
-    auto* change = static_cast<CKRDemoChange*>(CKRDemoChange::GetCKRDemoChangeType()->CreateInstance(CKRGuid()));
-    change->m_What = CKRString::Formatted(L"line (%g, %g) - (%g, %g)", m_Start[0], m_Start[1], world[0], world[1]);
-    m_pModel->NotifyObservers(change);
-  }
-  void OnKeyDown(unsigned int key, unsigned int, int, int) override {
-    Print(CKRString::Formatted(L"  tool: key %u%s\n", key, key == kEscape && m_Drawing ? L", line cancelled" : L""));
-    if (key == kEscape)
-      m_Drawing = false;
-  }
-
-  static constexpr unsigned kEscape = 27;  // the ASCII escape character
-
-private:
-  WorldPoint m_Start;
-  bool m_Drawing = false;
 };
-KR_IMPLEMENT_SERIAL_TYPE(CKRDemoLineTool, CKRTool)
-void CKRDemoLineTool::CKRDemoLineToolType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
+KR_IMPLEMENT_SERIAL_TYPE(CKRDemoOneWayStreet, CKRGraphEdge)
+
+// The host's display settings: a section with a field of its own.
+class CKRDemoDisplaySection : public CKRPreferenceSection {
+  KR_DECLARE_SERIAL_TYPE(CKRDemoDisplaySection, CKRSerialObjectTypeImpl, "{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B04}")
+public:
+  int m_Digits = 3;
+};
+KR_IMPLEMENT_SERIAL_TYPE(CKRDemoDisplaySection, CKRPreferenceSection)
+
+void CKRDemoJunction::CKRDemoJunctionType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
+  AppendParentFields(target, object);
+  BindField<CKRFieldT<CKRString>>(target, object, &CKRDemoJunction::m_Name, L"Name", L"The junction's name",
+                                  CKRGuid::Literal("{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B11}"), KRDT_STRING,
+                                  KRF_READ | KRF_WRITE | KRF_VISIBLE);
+}
+
+void CKRDemoRoundabout::CKRDemoRoundaboutType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
   AppendParentFields(target, object);
 }
 
-namespace {
-// What a window does with one piece of pointer or key input.
-void Send(CKRMDIChildWnd& window, int kind, int first, int x, int y, double worldX, double worldY) {
-  auto* event = static_cast<CKRToolEvent*>(CKRToolEvent::GetCKRToolEventType()->CreateInstance(CKRGuid()));
-  event->m_Kind = kind;
-  event->m_FirstParameter = first;
-  event->m_PositionX = x;
-  event->m_PositionY = y;
-  event->m_WorldX = worldX;
-  event->m_WorldY = worldY;
-  window.RaiseEvent(event);  // the router releases the event after delivery
+void CKRDemoOneWayStreet::CKRDemoOneWayStreetType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
+  AppendParentFields(target, object);
 }
+
+void CKRDemoDisplaySection::CKRDemoDisplaySectionType::CreateFields(CKRSerialObjectTypeImpl* target,
+                                                                   IKRObject* object) {
+  AppendParentFields(target, object);
+  BindField<CKRFieldT<int>>(target, object, &CKRDemoDisplaySection::m_Digits, L"Digits", L"Digits shown",
+                            CKRGuid::Literal("{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B12}"), KRDT_INTEGER,
+                            KRF_READ | KRF_WRITE | KRF_VISIBLE);
+}
+
+namespace {
+
+CKRDemoJunction* NewJunction(IKRObjectType* type, const wchar_t* name) {
+  auto* junction = dynamic_cast<CKRDemoJunction*>(type->CreateInstance(CKRGuid()));
+  junction->m_Name = name;
+  return junction;
+}
+
+void Join(IKRObjectType* type, CKRGraphNode* from, CKRGraphNode* to) {
+  auto* street = static_cast<CKRGraphEdge*>(type->CreateInstance(CKRGuid()));
+  street->SetNodes(from, to);
+  street->Connect();
+}
+
+void PrintCollected(const wchar_t* title, CKRDFSVisitor* visitor) {
+  Print(title);
+  auto nodes = visitor->GetDFSNodeIterator();
+  for (CKRGraphNode* node = nodes.Next(1); node != nullptr; node = nodes.Next(0))
+    Print(L" " + static_cast<CKRDemoJunction*>(node)->m_Name);
+  Print(L"\n");
+}
+
+template <class T>
+T* NewVisitor(IKRObjectType* type) {
+  return static_cast<T*>(type->CreateInstance(CKRGuid()));
+}
+
 }  // namespace
 
 void KRDemoFramework() {
   CKRTypeSystem::Initialize(kRepository);
-  auto* model = static_cast<CKRModel*>(CKRModelVoid::GetCKRModelVoidType()->CreateInstance(CKRGuid()));
-  CKRDemoView* views[2] = {};
-  const wchar_t* names[2] = {L"plan", L"list"};
-  for (int i = 0; i < 2; ++i) {
-    views[i] = static_cast<CKRDemoView*>(CKRDemoView::GetCKRDemoViewType()->CreateInstance(CKRGuid()));
-    views[i]->m_Name = names[i];
-    model->AddView(views[i]);
-  }
 
-  {
-    CKRMDIChildWnd window(L"Drawing1");
-    auto* tool = static_cast<CKRDemoLineTool*>(CKRDemoLineTool::GetCKRDemoLineToolType()->CreateInstance(CKRGuid()));
-    tool->m_pModel = model;
-    window.AddTool(tool);  // the window owns its tools
-    Print(CKRString::Formatted(L"window \"%s\": %d tool, default tool %d, activated: %d\n", window.GetTitle().c_str(),
-                               window.GetToolCount(), window.GetDefaultToolID(), window.SetDefaultTool()));
-    Send(window, CKRToolEvent::KIND_MOUSE_DOWN, 1, 10, 20, 0.0, 0.0);
-    Send(window, CKRToolEvent::KIND_MOUSE_MOVE, 1, 60, 20, 5.0, 0.0);
-    Send(window, CKRToolEvent::KIND_MOUSE_UP, 1, 110, 70, 10.0, 5.0);
-    Send(window, CKRToolEvent::KIND_MOUSE_DOWN, 1, 5, 5, -0.5, -0.5);
-    Send(window, CKRToolEvent::KIND_KEY_DOWN, int(CKRDemoLineTool::kEscape), 0, 0, 0.0, 0.0);
-    Send(window, CKRToolEvent::KIND_MOUSE_UP, 1, 8, 8, 1.0, 1.0);
-  }
+  // Market - Bridge - Station both ways, a roundabout at the bridge, and a
+  // one-way street from the station back to the market.
+  IKRObjectType* junction = CKRDemoJunction::GetCKRDemoJunctionType();
+  CKRDemoJunction* market = NewJunction(junction, L"Market");
+  CKRDemoJunction* bridge = NewJunction(CKRDemoRoundabout::GetCKRDemoRoundaboutType(), L"Bridge");
+  CKRDemoJunction* station = NewJunction(junction, L"Station");
+  CKRDemoJunction* harbour = NewJunction(CKRDemoRoundabout::GetCKRDemoRoundaboutType(), L"Harbour");
+  IKRObjectType* street = CKRGraphEdge::GetCKRGraphEdgeType();
+  Join(street, market, bridge);
+  Join(street, bridge, station);
+  Join(CKRDemoOneWayStreet::GetCKRDemoOneWayStreetType(), station, harbour);
+  Join(CKRDemoOneWayStreet::GetCKRDemoOneWayStreetType(), harbour, market);
+  Print(CKRString::Formatted(L"1. Four junctions; the market has %d streets, its first neighbour is %s\n",
+                             market->GetEdgeCollection()->GetCount(),
+                             static_cast<CKRDemoJunction*>(market->GetNeighbor(0))->m_Name.c_str()));
 
-  model->RemoveView(views[1]->GetInstanceID());
-  Print(L"the list view closed; the plan view still hears the model:\n");
-  auto* change = static_cast<CKRDemoChange*>(CKRDemoChange::GetCKRDemoChangeType()->CreateInstance(CKRGuid()));
-  change->m_What = L"drawing renamed";
-  model->NotifyObservers(change);
+  auto* walk = NewVisitor<CKRDFSVisitor>(CKRDFSVisitor::GetCKRDFSVisitorType());
+  walk->Start(market);
+  PrintCollected(L"2. Depth-first from the market:", walk);
+  walk->ClearDFSNodeList();
+  walk->Start(harbour);
+  PrintCollected(L"   From the harbour, whose one-way streets lead only to the market:", walk);
+  walk->Release();
 
-  model->Release();
-  for (CKRDemoView* view : views)
-    view->Release();
+  auto* roundabouts = NewVisitor<CKRFilteredDFSVisitor>(CKRFilteredDFSVisitor::GetCKRFilteredDFSVisitorType());
+  Print(CKRString::Formatted(L"3. A filtered walk without seek types starts: %d\n", roundabouts->Start(market)));
+  roundabouts->AddSeekType(CKRDemoRoundabout::TypeID);
+  roundabouts->Start(market);
+  PrintCollected(L"   Roundabouts reachable from the market:", roundabouts);
+  roundabouts->Release();
+
+  auto* release = NewVisitor<CKRReleaseVisitor>(CKRReleaseVisitor::GetCKRReleaseVisitorType());
+  Print(CKRString::Formatted(L"4. A release walk from the market releases the map and its streets: %d\n",
+                             release->Start(market)));
+  release->Release();
+
+  auto* preferences = static_cast<CKRPreferences*>(CKRPreferences::GetCKRPreferencesType()->CreateInstance(CKRGuid()));
+  auto* general = static_cast<CKRPreferenceSection*>(
+      CKRPreferenceSection::GetCKRPreferenceSectionType()->CreateInstance(CKRGuid()));
+  auto* display = static_cast<CKRDemoDisplaySection*>(
+      CKRDemoDisplaySection::GetCKRDemoDisplaySectionType()->CreateInstance(CKRGuid()));
+  Print(L"5. A new section is called \"" + general->GetName() + L"\"\n");
+  general->SetName(L"General");
+  general->SetDescription(L"Settings of every document");
+  display->SetName(L"Display");
+  display->m_Digits = 4;
+  preferences->GetPreferenceSectionMap().Add(general);
+  preferences->GetPreferenceSectionMap().Add(display);
+  Print(L"   Preferences with two sections, in instance-ID order:\n");
+  for (auto [id, section] : preferences->GetPreferenceSectionMap())
+    Print(CKRString::Formatted(L"   %s  %s: %s\n", id.GetCString().c_str(), section->GetName().c_str(),
+                               section->GetDescription().c_str()));
+  preferences->GetPreferenceSectionMap().RemoveAll(true);
+  preferences->Release();
 }

@@ -8,8 +8,10 @@ int main() {
   KRDemoObjectModel();
   PrintSection(L"Fields and storable objects");
   KRDemoSerialization();
-  PrintSection(L"Models, views and tools");
+  PrintSection(L"Graphs, walks and preferences");
   KRDemoFramework();
+  PrintSection(L"Models, views and tools");
+  KRDemoTools();
   PrintSection(L"Units and engineering values");
   KRDemoUnits();
   PrintSection(L"Math in two precisions");

@@ -44,10 +44,13 @@
 #include <krCoreLib/serialization/KRFieldTypes.h>
 
 // Application framework.
+#include <krCoreLib/framework/CKRGraphNode.h>
+#include <krCoreLib/framework/CKRGraphNodeVisitor.h>
+#include <krCoreLib/framework/CKRModel.h>
 #include <krCoreLib/framework/CKRObservable.h>
 #include <krCoreLib/framework/CKRObservation.h>
 #include <krCoreLib/framework/CKRObserver.h>
-#include <krCoreLib/framework/CKRModel.h>
+#include <krCoreLib/framework/CKRPreferences.h>
 #include <krCoreLib/framework/CKRTool.h>
 #include <krCoreLib/framework/CKRToolEvent.h>
 
