@@ -13,12 +13,15 @@
 // process and refuses it when that child does not come back from the
 // loader in good order. The verdict is remembered per file identity
 // (device, inode, size and modification time), so reloading an unchanged
-// file costs one stat. The trial needs a process that may fork: it is meant
+// file costs one stat. TryAll tries a whole folder's files in one child
+// (a new child continues after a file that ended one), so that a folder
+// costs one process rather than one per file. The trial needs a process that may fork: it is meant
 // for the thread that loads modules, with no other thread loading modules
 // at the same time.
 #pragma once
 
 #include <string>
+#include <vector>
 
 struct SKRModuleLoader {
   // Loads the module at `path`: its handle, or null with `error` set to the
@@ -28,6 +31,9 @@ struct SKRModuleLoader {
   // The address of the exported function `name` of a loaded module, or null
   // with `error` set to the loader's text ("<path>: undefined symbol: ...").
   static void* FindExport(void* module, const char* name, std::string& error);
+  // Tries in advance every file of `paths` whose identity has no verdict
+  // yet, in order, in as few child processes as their failures allow.
+  static void TryAll(const std::vector<std::string>& paths);
   // Unloads a module loaded by Load; null is ignored.
   static void Unload(void* module) noexcept;
   // Forgets the remembered verdicts (tests).

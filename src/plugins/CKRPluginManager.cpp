@@ -18,6 +18,17 @@ CKRString LoaderText(const std::string& text) {
   return CKRString::FromUtf8(text);
 }
 
+// The module's code called while a plug-in is made: an exception it lets
+// out counts as no result (nothing may be thrown through the manager).
+template <class TCall>
+auto CallGuarded(TCall call) -> decltype(call()) {
+  try {
+    return call();
+  } catch (...) {
+    return nullptr;
+  }
+}
+
 }  // namespace
 
 CKRPluginManager::~CKRPluginManager() = default;
@@ -81,6 +92,14 @@ void CKRPluginManager::_LoadPlugins(CKRString folder) {
   std::vector<CKRString> names;
   CKRPathHelper::GetChildPaths(names, folder.GetString(), L"*.plg");
   const CKRString prefix = CKRPathHelper::AddSlash(folder.GetString());
+  // The folder's new modules are tried all at once, before any is loaded.
+  std::vector<std::string> natives;
+  for (const CKRString& name : names) {
+    std::string native;
+    if (SKRNativePath::ToNative((prefix + name).GetString(), native))
+      natives.push_back(std::move(native));
+  }
+  SKRModuleLoader::TryAll(natives);
   for (const CKRString& name : names)
     _LoadPlugin(prefix + name);
   _UpdateAllSockets();
@@ -114,9 +133,9 @@ void CKRPluginManager::_LoadPlugin(CKRString path) {
   CKRPlugin* plugin = nullptr;
   if (entry == nullptr) {
     failure = LoaderText(loaderText);
-  } else if ((type = entry()) == nullptr) {
+  } else if ((type = CallGuarded([entry] { return entry(); })) == nullptr) {
     failure = L"Internal Plugin Error";
-  } else if ((object = type->CreateInstance(CKRGuid())) == nullptr) {
+  } else if ((object = CallGuarded([type] { return type->CreateInstance(CKRGuid()); })) == nullptr) {
     failure = L"Couldn't Load Plugin";
   } else if ((plugin = dynamic_cast<CKRPlugin*>(object)) == nullptr) {
     // Not a plug-in: it goes back to its type before its module goes.

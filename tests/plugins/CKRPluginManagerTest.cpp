@@ -152,7 +152,9 @@ TEST_F(CKRPluginManagerTest, BrokenModulesBecomeErrorPlugins) {
       {BrokenModule(3), "Couldn't Load Plugin", true},
       {BrokenModule(4), "Couldn't Load Plugin", true},
       {BrokenModule(5), "Couldn't Load Plugin", true},
-      {BrokenModule(6), "initialisation ended abnormally", false},
+      // Whether the exception ends the trial process or comes out of its
+      // loader depends on the build: either way the module is refused.
+      {BrokenModule(6), "the module's initialisation", false},
   };
   CKRCountingSocket* socket = NewSocket<CKRCountingSocket>(CKRCountingSocket::GetCKRCountingSocketType());
   socket->RegisterWithManager();
