@@ -190,6 +190,25 @@ TEST_F(CKRPluginManagerTest, BrokenModulesBecomeErrorPlugins) {
   EXPECT_FALSE(CKRPluginManager::GetSocketIterator().Next(1));
 }
 
+// A folder's new modules are tried together; one whose initialisation
+// throws or crashes ends that trial, and the others still load.
+TEST_F(CKRPluginManagerTest, FolderWithModulesThatFailAtLoadStillLoadsTheRest) {
+  CKRScratchFolder scratch;
+  ASSERT_FALSE(scratch.Path().empty());
+  Copy(ExampleModule("shapes"), scratch / "a-shapes.plg");
+  Copy(BrokenModule(6), scratch / "b-throws.plg");
+  Copy(BrokenModule(6), scratch / "c-throws.plg");
+  Copy(ExampleModule("notes"), scratch / "d-notes.plg");
+  CKRPluginManager::LoadPlugins(Wide(scratch.Path()));
+  ASSERT_EQ(Plugins().size(), 4u);
+  EXPECT_NE(PluginNamed(L"Shapes"), nullptr);
+  EXPECT_NE(PluginNamed(L"Notes"), nullptr);
+  int errors = 0;
+  for (CKRPlugin* plugin : Plugins())
+    errors += plugin->GetConfiguration()->m_Name == L"Plugin Error" ? 1 : 0;
+  EXPECT_EQ(errors, 2);
+}
+
 TEST_F(CKRPluginManagerTest, MissingOrUnreadableFolderLoadsNothingAndUpdatesNothing) {
   CKRCountingSocket* socket = NewSocket<CKRCountingSocket>(CKRCountingSocket::GetCKRCountingSocketType());
   CKRPluginManager::RegisterSocket(socket);
