@@ -13,6 +13,13 @@
 // compared without case) is skipped; a plug-in whose ID another loaded
 // plug-in has is discarded with its module. Nothing throws.
 //
+// A module's static initialisation runs while it is loaded, and one that
+// throws or crashes would take the host with it: a file is therefore first
+// loaded in a short-lived child process (a folder's new files all in one),
+// and refused with an error plug-in when that child does not come back in
+// good order. The verdict is kept per file (device, inode, size, time), so
+// loading an unchanged file again costs no further process.
+//
 // A module stays loaded while its plug-in lives. Before it is unloaded,
 // its plug-in is taken out of every socket and released, and the
 // repository of its types is released (so that the type system never keeps
@@ -46,8 +53,9 @@ public:
   // The number the first registered command gets.
   static constexpr unsigned FirstCmdID = 2345;
 
-  // Loads every ".plg" entry of `folder` (in the order the file system
-  // lists them), then updates every socket once. A missing or unreadable
+  // Loads every entry of `folder` whose name ends in ".plg" (letters as
+  // written: the file system's names are case-sensitive), in the order the
+  // file system lists them, then updates every socket once. A missing or unreadable
   // folder loads nothing and updates nothing.
   static void LoadPlugins(CKRString folder);
   // Loads one module (see above); the sockets are offered the plug-in but
