@@ -279,6 +279,7 @@ TEST_F(CKRPluginManagerTest, PluginThatRefusesToEndKeepsItsModule) {
   EXPECT_TRUE(Plugins().empty());
   EXPECT_TRUE(IsMapped(path));
   EXPECT_EQ(stubborn->GetType()->GetInstance(stubborn->GetInstanceID()), stubborn);
+  EXPECT_EQ(stubborn->Release(), 1);  // it gives in the second time
 }
 
 TEST_F(CKRPluginManagerTest, CommandNumbersResourceAndReleaseStartAfresh) {

@@ -3,7 +3,7 @@
 //   1 no "GetPluginType" export        2 the export returns null
 //   3 the type creates no object       4 the object is not a plug-in
 //   5 OnInitialize refuses             6 a static constructor throws
-//   7 a plug-in whose release is refused
+//   7 a plug-in that refuses its first release
 #include <krCoreLib/krCoreLib.h>
 
 #include <stdexcept>
@@ -28,10 +28,13 @@ public:
   int ShouldRegister(CKRPluginSocket*) override { return 1; }
   CKRPluginCfg* GetConfiguration() override { return nullptr; }
   int OnInitialize() override { return KR_BROKEN_KIND == 5 ? 0 : 1; }
-  int OnBeforeRelease() override { return KR_BROKEN_KIND == 7 ? 0 : 1; }
+  int OnBeforeRelease() override { return KR_BROKEN_KIND == 7 && m_Refusals++ == 0 ? 0 : 1; }
 
 protected:
   CKRBrokenPlugin() = default;
+
+private:
+  int m_Refusals = 0;
 };
 #if KR_BROKEN_KIND == 3
 KR_IMPLEMENT_ABSTRACT_OBJECT_TYPE(CKRBrokenPlugin, CKRPlugin)
