@@ -25,3 +25,4 @@ void KRDemoMath();
 void KRDemoGeometry();
 void KRDemoFiles();
 void KRDemoThreads();
+void KRDemoPlugins();

@@ -22,6 +22,8 @@ int main() {
   KRDemoFiles();
   PrintSection(L"Threads and locks");
   KRDemoThreads();
+  PrintSection(L"Plug-ins, sockets and menus");
+  KRDemoPlugins();
 
   // Shutdown: the type system, then the process-wide singletons.
   CKRTypeSystem::Release();

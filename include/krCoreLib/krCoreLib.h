@@ -8,6 +8,8 @@
 
 #include <krCoreLib/platform/KRBStr.h>
 #include <krCoreLib/platform/KRGuidDef.h>
+#include <krCoreLib/platform/KRCmdTarget.h>
+#include <krCoreLib/platform/KRMenu.h>
 
 #include <krCoreLib/objectmodel/CKRGuid.h>
 #include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
@@ -56,6 +58,14 @@
 
 // User interface: the document window as a host of tools.
 #include <krCoreLib/ui/CKRMDIChildWnd.h>
+
+// Plug-ins: configuration, loading, sockets, commands and menus.
+#include <krCoreLib/plugins/CKRPlugin.h>
+#include <krCoreLib/plugins/CKRPluginCfg.h>
+#include <krCoreLib/plugins/CKRPluginCmd.h>
+#include <krCoreLib/plugins/CKRPluginManager.h>
+#include <krCoreLib/plugins/CKRPluginSocket.h>
+#include <krCoreLib/plugins/IKRPlugin.h>
 
 // Units and engineering values.
 #include <krCoreLib/units/CKRColor.h>

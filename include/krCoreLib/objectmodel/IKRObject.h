@@ -11,7 +11,7 @@
 class IKRObjectType;
 
 // Interface ID of IKRObject.
-inline constexpr CKRGuid IID_IKRObject = CKRGuid::Literal("{95E11590-E209-41B1-811A-263330087175}");
+KRCORELIB_LOCAL inline constexpr CKRGuid IID_IKRObject = CKRGuid::Literal("{95E11590-E209-41B1-811A-263330087175}");
 
 class KRCORELIB_API IKRUnknown {
 public:
