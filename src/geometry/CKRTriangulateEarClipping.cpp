@@ -151,25 +151,8 @@ bool CKRTriangulateEarClipping<Real, Other>::Triangulate(int n, int* indices) {
     const int ear = m_iEFirst;
     const int p = m_Vertex[ear].VPrev;
     const int q = m_Vertex[ear].VNext;
-    for (int side = 0; side < 2; ++side) {
-      const int v = side == 0 ? p : q;
-      Vertex& vertex = m_Vertex[v];
-      if (!vertex.IsEar) {
-        const bool wasReflex = !vertex.IsConvex;
-        if (IsConvex(v)) {
-          if (wasReflex)
-            RemoveR(v);
-          if (IsEar(v)) {
-            if (side == 0)
-              InsertBeforeE(v);
-            else
-              InsertAfterE(v);
-          }
-        }
-      } else if (!IsEar(v)) {
-        RemoveE(v);
-      }
-    }
+    Update(p, true);
+    Update(q, false);
     // The ear just cut leaves the ring; the next one is cut in turn.
     RemoveE(ear);
     if (m_iEFirst == -1)
@@ -195,16 +178,56 @@ bool CKRTriangulateEarClipping<Real, Other>::IsConvex(int i) {
   return vertex.IsConvex;
 }
 
+// A reflex vertex anywhere in the closed triangle other than at its corners
+// blocks the ear: cut with a reflex vertex on its diagonal, the rest of the
+// polygon would touch itself there, and a later ear at that vertex could
+// turn over. Every simple polygon keeps two ears whose diagonals touch no
+// other vertex, so the stricter test never runs out of ears.
 template <class Real, class Other>
 bool CKRTriangulateEarClipping<Real, Other>::IsEar(int i) {
   Vertex& vertex = m_Vertex[i];
   vertex.IsEar = true;
-  for (int j = m_iRFirst; j != -1; j = m_Vertex[j].SNext)
-    if (m_pQuery->ToTriangle(j, vertex.VPrev, i, vertex.VNext) < 0) {
+  for (int j = m_iRFirst; j != -1; j = m_Vertex[j].SNext) {
+    if (j == vertex.VPrev || j == i || j == vertex.VNext)
+      continue;
+    if (m_pQuery->ToTriangle(j, vertex.VPrev, i, vertex.VNext) <= 0) {
       vertex.IsEar = false;
       break;
     }
+  }
   return vertex.IsEar;
+}
+
+// A neighbour of the ear just cut: its angle has shrunk, so a reflex vertex
+// may have turned convex and become an ear, and an ear may have stopped
+// being one. Convexity is tested again for ears too: with straight
+// vertices, or an approximate strategy, an ear can turn reflex, and it then
+// joins the reflex list so that it blocks the ears around it.
+template <class Real, class Other>
+void CKRTriangulateEarClipping<Real, Other>::Update(int v, bool beforeFirst) {
+  Vertex& vertex = m_Vertex[v];
+  const bool wasConvex = vertex.IsConvex;
+  const bool wasEar = vertex.IsEar;
+  if (!IsConvex(v)) {
+    if (wasEar)
+      RemoveE(v);
+    if (wasConvex) {
+      vertex.SPrev = vertex.SNext = -1;  // out of the convex list, which is no longer walked
+      InsertAfterR(v);
+    }
+    return;
+  }
+  if (!wasConvex)
+    RemoveR(v);
+  const bool ear = IsEar(v);
+  if (ear && !wasEar) {
+    if (beforeFirst)
+      InsertBeforeE(v);
+    else
+      InsertAfterE(v);
+  } else if (!ear && wasEar) {
+    RemoveE(v);
+  }
 }
 
 template <class Real, class Other>

@@ -21,6 +21,10 @@
 //                                       triangles: the polygon is not simple,
 //                                       or it has straight vertices the
 //                                       clipping could not get round.
+// A vertex is an ear when it is convex and no reflex vertex other than the
+// triangle's corners lies in its closed triangle: a reflex vertex on the
+// diagonal blocks the cut, which would leave a polygon touching itself.
+// Neighbours of a cut ear are tested again for convexity and ear-ness.
 // Straight (collinear) vertices of an otherwise simple polygon are fine
 // where an ear remains; such a vertex may end up in a triangle of zero area.
 //
@@ -80,6 +84,9 @@ private:
 
   bool IsConvex(int i);
   bool IsEar(int i);
+  // Tests a neighbour of the ear just cut again and moves it between the
+  // lists; an ear that joins the ring goes before or after the first ear.
+  void Update(int v, bool beforeFirst);
   void InsertAfterC(int i);  // appends to the convex list
   void InsertAfterR(int i);  // appends to the reflex list
   void RemoveR(int i);
