@@ -284,24 +284,14 @@ bool Query2Filtered<Real, Other>::Trusted(Real d, Real bound) const noexcept {
   return std::fabs(d) > bound || (std::fabs(d) == bound && (bound > 0 || m_fUncertainty == 0));
 }
 
-// The floating-point determinant decides when it is at least u times the
-// product of the two lengths; below that the exact orientation answers
-// (orient2d is exact for every finite float input: the differences and
-// products of floats neither overflow nor underflow in double), and the
-// rationals answer for input that is not finite.
+// Below the filter's bound the exact orientation answers (orient2d is
+// exact for every finite float input: the differences and products of
+// floats neither overflow nor underflow in double), and the rationals
+// answer for input that is not finite.
 template <class Real, class Other>
-int Query2Filtered<Real, Other>::ToLine(const Vector& p, int a, int b) const {
+int Query2Filtered<Real, Other>::ExactLine(const Vector& p, int a, int b) const {
   const Vector& va = this->m_akVertex[a];
   const Vector& vb = this->m_akVertex[b];
-  const Real x0 = Real(p.X()) - Real(va.X());
-  const Real y0 = Real(p.Y()) - Real(va.Y());
-  const Real x1 = Real(vb.X()) - Real(va.X());
-  const Real y1 = Real(vb.Y()) - Real(va.Y());
-  const Real d = Base::Det2(x0, y0, x1, y1);
-  const Real length0 = std::sqrt(x0 * x0 + y0 * y0);
-  const Real length1 = std::sqrt(x1 * x1 + y1 * y1);
-  if (Trusted(d, m_fUncertainty * length0 * length1))
-    return Sign(double(d));
   const double exact = krPolygonTriangulation::orient2d(va.X(), va.Y(), vb.X(), vb.Y(), p.X(), p.Y());
   if (exact == exact)
     return -Sign(exact);  // orient2d is positive when p lies left

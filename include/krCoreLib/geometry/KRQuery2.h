@@ -39,8 +39,9 @@
 //                  ToCircumcircle below 2^4 (float) or 2^10 (double);
 //                  otherwise rounding may flip nearly degenerate answers.
 //   TYPE_FILTERED  Query2Filtered with uncertainty u: the floating-point
-//                  value decides when abs(d) >= u * (product of the row
-//                  lengths), an exact evaluation otherwise. ToLine's exact
+//                  value decides when abs(d) exceeds u times the product of
+//                  the row lengths (ToLine compares the squares), an exact
+//                  evaluation otherwise. ToLine's exact
 //                  stage is the adaptive orientation predicate (exact for all
 //                  finite float coordinates), then the rationals (non-finite
 //                  input); ToCircumcircle's is the rationals. With u at least
@@ -233,10 +234,28 @@ public:
   Query::Type GetType() const override { return Query::TYPE_FILTERED; }
   using Base::ToCircumcircle;
   using Base::ToLine;
-  int ToLine(const Vector& p, int a, int b) const override;
+  // Inline, so that a call on a known query object costs no more than the
+  // floating-point test; squares compare, which spares the square roots of
+  // the two lengths. A square that overflows is trusted only against a
+  // finite bound, one that underflows to the bound is not trusted.
+  int ToLine(const Vector& p, int a, int b) const override {
+    const Vector& va = this->m_akVertex[a];
+    const Vector& vb = this->m_akVertex[b];
+    const Real x0 = Real(p.X()) - Real(va.X());
+    const Real y0 = Real(p.Y()) - Real(va.Y());
+    const Real x1 = Real(vb.X()) - Real(va.X());
+    const Real y1 = Real(vb.Y()) - Real(va.Y());
+    const Real d = x0 * y1 - x1 * y0;
+    const Real bound = m_fUncertainty * m_fUncertainty * (x0 * x0 + y0 * y0) * (x1 * x1 + y1 * y1);
+    if (d * d > bound || m_fUncertainty == Real(0))
+      return (d > Real(0)) - (d < Real(0));
+    return ExactLine(p, a, b);
+  }
   int ToCircumcircle(const Vector& p, int a, int b, int c) const override;
 
 private:
+  // The exact stage of ToLine.
+  int ExactLine(const Vector& p, int a, int b) const;
   bool Trusted(Real d, Real bound) const noexcept;
 
   Query2TRational<Real, Other> m_kRQuery;
