@@ -231,25 +231,24 @@ void CKRTriangulateEarClipping<Real, Other>::Update(int v, bool beforeFirst) {
 }
 
 template <class Real, class Other>
-void CKRTriangulateEarClipping<Real, Other>::InsertAfterC(int i) {
-  if (m_iCFirst == -1)
-    m_iCFirst = i;
+void CKRTriangulateEarClipping<Real, Other>::Append(int i, int& first, int& last) {
+  if (first == -1)
+    first = i;
   else {
-    m_Vertex[m_iCLast].SNext = i;
-    m_Vertex[i].SPrev = m_iCLast;
+    m_Vertex[last].SNext = i;
+    m_Vertex[i].SPrev = last;
   }
-  m_iCLast = i;
+  last = i;
+}
+
+template <class Real, class Other>
+void CKRTriangulateEarClipping<Real, Other>::InsertAfterC(int i) {
+  Append(i, m_iCFirst, m_iCLast);
 }
 
 template <class Real, class Other>
 void CKRTriangulateEarClipping<Real, Other>::InsertAfterR(int i) {
-  if (m_iRFirst == -1)
-    m_iRFirst = i;
-  else {
-    m_Vertex[m_iRLast].SNext = i;
-    m_Vertex[i].SPrev = m_iRLast;
-  }
-  m_iRLast = i;
+  Append(i, m_iRFirst, m_iRLast);
 }
 
 template <class Real, class Other>
@@ -278,37 +277,33 @@ void CKRTriangulateEarClipping<Real, Other>::InsertEndE(int i) {
 }
 
 // The ring is circular once built: an empty ring becomes a ring of one.
+// Otherwise i goes between `previous` and `next`, neighbours in the ring.
 template <class Real, class Other>
-void CKRTriangulateEarClipping<Real, Other>::InsertAfterE(int i) {
+bool CKRTriangulateEarClipping<Real, Other>::LinkE(int i, int previous, int next) {
   if (m_iEFirst == -1) {
     m_iEFirst = m_iELast = i;
     m_Vertex[i].EPrev = m_Vertex[i].ENext = i;
-    return;
+    return false;
   }
-  const int first = m_iEFirst;
-  const int next = m_Vertex[first].ENext;
-  m_Vertex[i].EPrev = first;
+  m_Vertex[i].EPrev = previous;
   m_Vertex[i].ENext = next;
-  m_Vertex[first].ENext = i;
+  m_Vertex[previous].ENext = i;
   m_Vertex[next].EPrev = i;
-  if (m_iELast == first)
+  return true;
+}
+
+template <class Real, class Other>
+void CKRTriangulateEarClipping<Real, Other>::InsertAfterE(int i) {
+  const int first = m_iEFirst;
+  if (LinkE(i, first, first != -1 ? m_Vertex[first].ENext : -1) && m_iELast == first)
     m_iELast = i;
 }
 
 template <class Real, class Other>
 void CKRTriangulateEarClipping<Real, Other>::InsertBeforeE(int i) {
-  if (m_iEFirst == -1) {
-    m_iEFirst = m_iELast = i;
-    m_Vertex[i].EPrev = m_Vertex[i].ENext = i;
-    return;
-  }
   const int first = m_iEFirst;
-  const int previous = m_Vertex[first].EPrev;
-  m_Vertex[i].EPrev = previous;
-  m_Vertex[i].ENext = first;
-  m_Vertex[first].EPrev = i;
-  m_Vertex[previous].ENext = i;
-  m_iELast = i;
+  if (LinkE(i, first != -1 ? m_Vertex[first].EPrev : -1, first))
+    m_iELast = i;
 }
 
 template <class Real, class Other>

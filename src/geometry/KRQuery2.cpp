@@ -32,6 +32,23 @@ std::int64_t Mul(std::int64_t a, std::int64_t b) { return std::int64_t(std::uint
 
 int Sign(double d) { return (d > 0) - (d < 0); }
 
+// The in-triangle rule over a line test line(u, v) of the point: outside
+// as soon as it lies right of b -> c, left of a -> c or right of a -> b; on
+// an edge when on any of those lines; strictly inside otherwise.
+template <class LineTest>
+int TriangleSign(LineTest&& line, int a, int b, int c) {
+  const int s0 = line(b, c);
+  if (s0 > 0)
+    return 1;
+  const int s1 = line(a, c);
+  if (s1 < 0)
+    return 1;
+  const int s2 = line(a, b);
+  if (s2 > 0)
+    return 1;
+  return s0 != 0 && s1 != 0 && s2 != 0 ? -1 : 0;
+}
+
 // The circumcircle determinant's sign rule: +1 outside (d < 0).
 int CircleSign(int sign) { return -sign; }
 
@@ -54,16 +71,7 @@ int Query2<Real, Other>::ToLine(const Vector& p, int a, int b) const {
 
 template <class Real, class Other>
 int Query2<Real, Other>::ToTriangle(const Vector& p, int a, int b, int c) const {
-  const int s0 = ToLine(p, b, c);
-  if (s0 > 0)
-    return 1;
-  const int s1 = ToLine(p, a, c);
-  if (s1 < 0)
-    return 1;
-  const int s2 = ToLine(p, a, b);
-  if (s2 > 0)
-    return 1;
-  return s0 != 0 && s1 != 0 && s2 != 0 ? -1 : 0;
+  return TriangleSign([&](int u, int v) { return ToLine(p, u, v); }, a, b, c);
 }
 
 template <class Real, class Other>
@@ -205,16 +213,7 @@ int Query2TRational<Real, Other>::ToLine(const RVector& p, int a, int b) const {
 
 template <class Real, class Other>
 int Query2TRational<Real, Other>::ToTriangle(const RVector& p, int a, int b, int c) const {
-  const int s0 = ToLine(p, b, c);
-  if (s0 > 0)
-    return 1;
-  const int s1 = ToLine(p, a, c);
-  if (s1 < 0)
-    return 1;
-  const int s2 = ToLine(p, a, b);
-  if (s2 > 0)
-    return 1;
-  return s0 != 0 && s1 != 0 && s2 != 0 ? -1 : 0;
+  return TriangleSign([&](int u, int v) { return ToLine(p, u, v); }, a, b, c);
 }
 
 template <class Real, class Other>

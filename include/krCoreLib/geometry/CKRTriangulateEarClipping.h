@@ -87,6 +87,8 @@ private:
   // Tests a neighbour of the ear just cut again and moves it between the
   // lists; an ear that joins the ring goes before or after the first ear.
   void Update(int v, bool beforeFirst);
+  void Append(int i, int& first, int& last);  // to the convex or the reflex list
+  bool LinkE(int i, int previous, int next);   // false when the ring was empty
   void InsertAfterC(int i);  // appends to the convex list
   void InsertAfterR(int i);  // appends to the reflex list
   void RemoveR(int i);
