@@ -40,14 +40,16 @@
 //                  otherwise rounding may flip nearly degenerate answers.
 //   TYPE_FILTERED  Query2Filtered with uncertainty u: the floating-point
 //                  value decides when abs(d) exceeds u times the product of
-//                  the row lengths (ToLine compares the squares), an exact
-//                  evaluation otherwise. ToLine's exact
-//                  stage is the adaptive orientation predicate (exact for all
-//                  finite float coordinates), then the rationals (non-finite
-//                  input); ToCircumcircle's is the rationals. With u at least
-//                  8 units of Real rounding (1e-6 for float, 2e-15 for
-//                  double) every answer is exact within the rational range;
-//                  u = 0 always trusts the floating-point value.
+//                  the row lengths (ToLine compares the squares; for
+//                  ToCircumcircle the third entry of a row counts as
+//                  |sx dx| + |sy dy|, which bounds its rounding), an exact
+//                  evaluation otherwise: for ToLine the adaptive orientation
+//                  predicate (exact for all finite float coordinates), then
+//                  the rationals (non-finite input); for ToCircumcircle the
+//                  rationals. With u at least 16 epsilon of Real (2e-6 for
+//                  float, 4e-15 for double) every answer is exact within the
+//                  rational range; u = 0 always trusts the floating-point
+//                  value.
 //
 // Thread safety: the rational strategy and the filtered one fill a cache of
 // converted vertices inside const queries; such a query must not be used by
