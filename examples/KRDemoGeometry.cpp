@@ -1,5 +1,6 @@
-// Geometry: the exact orientation test and the sweep-line triangulation of
-// a polygon with a hole; malformed input is reported and the host goes on.
+// Geometry: the exact orientation test, the sweep-line triangulation of a
+// polygon with a hole, and the ear clipping of an L-shaped polygon with the
+// exact predicates; malformed input is reported and the host goes on.
 #include "KRDemo.h"
 
 #include <vector>
@@ -57,4 +58,22 @@ void KRDemoGeometry() {
   reversed.Finish();
   Print(L"   the same contour added reversed: ");
   reversed.triangulation();
+
+  Print(L"\n5. Ear clipping of an L-shaped polygon, every decision exact (filtered predicates):\n");
+  using Vertex = CKRVector2T<float, double>;
+  const Vertex ell[] = {Vertex(0, 0), Vertex(2, 0), Vertex(2, 1), Vertex(1, 1), Vertex(1, 2), Vertex(0, 2)};
+  int* indices = nullptr;
+  const CKRTriangulateEarClipping<double, float> clipping(6, ell, krRationalArithmetic::Query::TYPE_FILTERED, 1e-12,
+                                                          indices);
+  for (int t = 0; t < clipping.GetTriangleCount(); ++t) {
+    const Vertex& a = ell[indices[3 * t]];
+    const Vertex& b = ell[indices[3 * t + 1]];
+    const Vertex& c = ell[indices[3 * t + 2]];
+    Print(CKRString::Formatted(L"   (%g, %g) (%g, %g) (%g, %g)\n", a.X(), a.Y(), b.X(), b.Y(), c.X(), c.Y()));
+  }
+  delete[] indices;
+  const Vertex clockwiseEll[] = {ell[0], ell[5], ell[4], ell[3], ell[2], ell[1]};
+  const CKRTriangulateEarClipping<double, float> refused(6, clockwiseEll, krRationalArithmetic::Query::TYPE_FILTERED,
+                                                         1e-12, indices);
+  Print(CKRString::Formatted(L"   the same polygon clockwise: \"%ls\"\n", refused.GetError().GetString()));
 }

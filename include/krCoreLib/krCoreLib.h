@@ -102,12 +102,16 @@
 #include <krCoreLib/geometry/CKRPolyLineT.h>
 #include <krCoreLib/geometry/CKRPolygonT.h>
 #include <krCoreLib/geometry/CKRTriangleT.h>
+#include <krCoreLib/geometry/CKRTriangulateEarClipping.h>
 #include <krCoreLib/geometry/CKRVertexSequenceT.h>
 #include <krCoreLib/geometry/CKRVertexSourceT.h>
 #include <krCoreLib/geometry/KRAdaptiveOrient2d.h>
+#include <krCoreLib/geometry/KRQuery2.h>
 #include <krCoreLib/geometry/KRSweepElements.h>
 #include <krCoreLib/geometry/KRSweepPolygon.h>
 #include <krCoreLib/geometry/KRSweepSplayTree.h>
+#include <krCoreLib/geometry/KRTInteger.h>
+#include <krCoreLib/geometry/KRTRational.h>
 
 // System services.
 #include <krCoreLib/system/CKRMemMapFile.h>

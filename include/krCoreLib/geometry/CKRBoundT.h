@@ -116,50 +116,26 @@ protected:
   Point m_Min;
 };
 
-template <class Real, class Other>
-class CKRBound2T : public CKRBoundT<2, Real, Other> {
-  using Base = CKRBoundT<2, Real, Other>;
-
-public:
-  using typename Base::Point;
-  CKRBound2T() noexcept = default;
-  CKRBound2T(const Base& b) noexcept : Base(b) {}
-  CKRBound2T(const Point& p1, const Point& p2) noexcept : Base(p1, p2) {}
-  CKRBound2T& operator=(const Base& b) noexcept {
-    Base::operator=(b);
-    return *this;
+// The named bounds: constructors and assignment only.
+#define KR_NAMED_BOUND(Name, Dimension)                                   \
+  template <class Real, class Other>                                      \
+  class Name : public CKRBoundT<Dimension, Real, Other> {                 \
+    using Base = CKRBoundT<Dimension, Real, Other>;                       \
+                                                                          \
+  public:                                                                 \
+    using typename Base::Point;                                           \
+    Name() noexcept = default;                                            \
+    Name(const Base& b) noexcept : Base(b) {}                             \
+    Name(const Point& p1, const Point& p2) noexcept : Base(p1, p2) {}     \
+    Name& operator=(const Base& b) noexcept {                             \
+      Base::operator=(b);                                                 \
+      return *this;                                                       \
+    }                                                                     \
   }
-};
-
-template <class Real, class Other>
-class CKRBound3T : public CKRBoundT<3, Real, Other> {
-  using Base = CKRBoundT<3, Real, Other>;
-
-public:
-  using typename Base::Point;
-  CKRBound3T() noexcept = default;
-  CKRBound3T(const Base& b) noexcept : Base(b) {}
-  CKRBound3T(const Point& p1, const Point& p2) noexcept : Base(p1, p2) {}
-  CKRBound3T& operator=(const Base& b) noexcept {
-    Base::operator=(b);
-    return *this;
-  }
-};
-
-template <class Real, class Other>
-class CKRBound4T : public CKRBoundT<4, Real, Other> {
-  using Base = CKRBoundT<4, Real, Other>;
-
-public:
-  using typename Base::Point;
-  CKRBound4T() noexcept = default;
-  CKRBound4T(const Base& b) noexcept : Base(b) {}
-  CKRBound4T(const Point& p1, const Point& p2) noexcept : Base(p1, p2) {}
-  CKRBound4T& operator=(const Base& b) noexcept {
-    Base::operator=(b);
-    return *this;
-  }
-};
+KR_NAMED_BOUND(CKRBound2T, 2);
+KR_NAMED_BOUND(CKRBound3T, 3);
+KR_NAMED_BOUND(CKRBound4T, 4);
+#undef KR_NAMED_BOUND
 
 extern template class KRCORELIB_API CKRBoundT<2, float, double>;
 extern template class KRCORELIB_API CKRBoundT<3, float, double>;

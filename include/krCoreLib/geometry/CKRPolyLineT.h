@@ -49,33 +49,24 @@ private:
   std::vector<Point> m_Points;
 };
 
-template <class Real, class Other>
-class CKRPolyLine3T : public CKRPolyLineT<3, Real, Other> {
-  using Base = CKRPolyLineT<3, Real, Other>;
-
-public:
-  CKRPolyLine3T() = default;
-  explicit CKRPolyLine3T(unsigned n) : Base(n) {}
-  CKRPolyLine3T(const Base& p) : Base(p) {}
-  CKRPolyLine3T& operator=(const Base& p) {
-    Base::operator=(p);
-    return *this;
+// The named polylines: constructors and assignment only.
+#define KR_NAMED_POLYLINE(Name, Dimension)                  \
+  template <class Real, class Other>                        \
+  class Name : public CKRPolyLineT<Dimension, Real, Other> { \
+    using Base = CKRPolyLineT<Dimension, Real, Other>;       \
+                                                            \
+  public:                                                   \
+    Name() = default;                                       \
+    explicit Name(unsigned n) : Base(n) {}                  \
+    Name(const Base& p) : Base(p) {}                        \
+    Name& operator=(const Base& p) {                        \
+      Base::operator=(p);                                   \
+      return *this;                                         \
+    }                                                       \
   }
-};
-
-template <class Real, class Other>
-class CKRPolyLine4T : public CKRPolyLineT<4, Real, Other> {
-  using Base = CKRPolyLineT<4, Real, Other>;
-
-public:
-  CKRPolyLine4T() = default;
-  explicit CKRPolyLine4T(unsigned n) : Base(n) {}
-  CKRPolyLine4T(const Base& p) : Base(p) {}
-  CKRPolyLine4T& operator=(const Base& p) {
-    Base::operator=(p);
-    return *this;
-  }
-};
+KR_NAMED_POLYLINE(CKRPolyLine3T, 3);
+KR_NAMED_POLYLINE(CKRPolyLine4T, 4);
+#undef KR_NAMED_POLYLINE
 
 extern template class KRCORELIB_API CKRPolyLineT<2, float, double>;
 extern template class KRCORELIB_API CKRPolyLineT<3, float, double>;

@@ -61,31 +61,23 @@ private:
   Sequence m_Sequence;
 };
 
-template <class Real, class Other>
-class CKRPolygon3T : public CKRPolygonT<3, Real, Other> {
-  using Base = CKRPolygonT<3, Real, Other>;
-
-public:
-  explicit CKRPolygon3T(unsigned n = 0) : Base(n) {}
-  CKRPolygon3T(const Base& p) : Base(p) {}
-  CKRPolygon3T& operator=(const Base& p) {
-    Base::operator=(p);
-    return *this;
+// The named polygons: constructors and assignment only.
+#define KR_NAMED_POLYGON(Name, Dimension)                   \
+  template <class Real, class Other>                        \
+  class Name : public CKRPolygonT<Dimension, Real, Other> { \
+    using Base = CKRPolygonT<Dimension, Real, Other>;       \
+                                                            \
+  public:                                                   \
+    explicit Name(unsigned n = 0) : Base(n) {}              \
+    Name(const Base& p) : Base(p) {}                        \
+    Name& operator=(const Base& p) {                        \
+      Base::operator=(p);                                   \
+      return *this;                                         \
+    }                                                       \
   }
-};
-
-template <class Real, class Other>
-class CKRPolygon4T : public CKRPolygonT<4, Real, Other> {
-  using Base = CKRPolygonT<4, Real, Other>;
-
-public:
-  explicit CKRPolygon4T(unsigned n = 0) : Base(n) {}
-  CKRPolygon4T(const Base& p) : Base(p) {}
-  CKRPolygon4T& operator=(const Base& p) {
-    Base::operator=(p);
-    return *this;
-  }
-};
+KR_NAMED_POLYGON(CKRPolygon3T, 3);
+KR_NAMED_POLYGON(CKRPolygon4T, 4);
+#undef KR_NAMED_POLYGON
 
 extern template class KRCORELIB_API CKRPolygonT<2, float, double>;
 extern template class KRCORELIB_API CKRPolygonT<3, float, double>;
