@@ -16,8 +16,9 @@ namespace {
 
 using Strings = std::vector<std::string>;
 
-// Creations ("+N") and destructions ("-N") in the order they happen. Singletons
-// are created and released under the singleton lock, so it needs no lock.
+// Creations ("+N") and destructions ("-N") in the order they happen. It needs
+// no lock: singletons are created under the singleton lock, and the tests
+// release them from one thread at a time.
 Strings& Events() {
   static Strings events;
   return events;

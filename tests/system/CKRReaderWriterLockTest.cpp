@@ -15,11 +15,24 @@ void ExpectFree(TLock& lock) {
   EXPECT_EQ(lock.GetWaitingReaderCount(), 0);
 }
 
+}  // namespace
+
+// Both locks: what they share is tested on each.
+template <class TLock>
+class CKRReaderWriterLockTest : public testing::Test {};
+struct SKRLockNames {
+  template <class TLock>
+  static std::string GetName(int) {
+    return std::is_same_v<TLock, CKRReaderWriterLock> ? "CKRReaderWriterLock" : "CReaderWriterLockNonReentrance";
+  }
+};
+using KRLockTypes = testing::Types<CReaderWriterLockNonReentrance, CKRReaderWriterLock>;
+TYPED_TEST_SUITE(CKRReaderWriterLockTest, KRLockTypes, SKRLockNames);
+
 // A writer waits for a reader; readers arriving behind a waiting writer wait
 // too, and a second writer still goes before them.
-template <class TLock>
-void CheckWriterPreference() {
-  TLock lock;
+TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
+  TypeParam lock;
   std::mutex logMutex;
   std::string log;
   auto logged = [&](bool write) {
@@ -48,10 +61,9 @@ void CheckWriterPreference() {
 }
 
 // Releasing what the thread does not hold changes nothing and is reported.
-template <class TLock>
-void CheckUnheldReleasesAreIgnored() {
+TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
   krtest::CDebugRecorder recorder;
-  TLock lock;
+  TypeParam lock;
   CActor reader, writer;
   ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
   lock.ReleaseReaderLock();
@@ -81,9 +93,8 @@ void CheckUnheldReleasesAreIgnored() {
 
 // A thread killed while it waits for the lock leaves it as if it had never
 // asked.
-template <class TLock>
-void CheckKilledWaitersLeaveTheLockConsistent() {
-  TLock lock;
+TYPED_TEST(CKRReaderWriterLockTest, KilledWaitersLeaveTheLockConsistent) {
+  TypeParam lock;
   CActor holder, another;
   ASSERT_TRUE(holder.Do([&] { lock.AcquireReaderLock(); }));
   CFunctionThread writer([&](CFunctionThread&) -> unsigned long {
@@ -122,12 +133,12 @@ void CheckKilledWaitersLeaveTheLockConsistent() {
 }
 
 // Four threads write a pair of fields under the write lock and check it under
-// the read lock. `modes` 2 reads and writes plainly; 5 adds nested reads, an
-// upgrade with downgrade, and nested writes with a read inside.
-template <class TLock>
-void CheckNoTornUpdate(unsigned modes) {
+// the read lock: plain reads and writes, and for the reentrant lock nested
+// reads, an upgrade with downgrade, and nested writes with a read inside.
+TYPED_TEST(CKRReaderWriterLockTest, ReadersAndWritersNeverSeeATornUpdate) {
   constexpr int kRounds = 20000;
-  TLock lock;
+  const unsigned modes = std::is_same_v<TypeParam, CKRReaderWriterLock> ? 5 : 2;
+  TypeParam lock;
   long long first = 0, second = 0;
   std::atomic<int> faults{0}, readers{0}, writers{0};
   auto read = [&] {
@@ -184,32 +195,6 @@ void CheckNoTornUpdate(unsigned modes) {
   ExpectFree(lock);
 }
 
-}  // namespace
-
-TEST(CReaderWriterLockNonReentrance, PrefersWriters) {
-  CheckWriterPreference<CReaderWriterLockNonReentrance>();
-}
-
-TEST(CKRReaderWriterLock, PrefersWriters) {
-  CheckWriterPreference<CKRReaderWriterLock>();
-}
-
-TEST(CReaderWriterLockNonReentrance, IgnoresReleasesByThreadsThatHoldNothing) {
-  CheckUnheldReleasesAreIgnored<CReaderWriterLockNonReentrance>();
-}
-
-TEST(CKRReaderWriterLock, IgnoresReleasesByThreadsThatHoldNothing) {
-  CheckUnheldReleasesAreIgnored<CKRReaderWriterLock>();
-}
-
-TEST(CReaderWriterLockNonReentrance, KilledWaitersLeaveTheLockConsistent) {
-  CheckKilledWaitersLeaveTheLockConsistent<CReaderWriterLockNonReentrance>();
-}
-
-TEST(CKRReaderWriterLock, KilledWaitersLeaveTheLockConsistent) {
-  CheckKilledWaitersLeaveTheLockConsistent<CKRReaderWriterLock>();
-}
-
 TEST(CKRReaderWriterLock, ARecursiveReaderDoesNotWaitForAWaitingWriter) {
   CKRReaderWriterLock lock;
   CActor reader, writer;
@@ -260,14 +245,6 @@ TEST(CKRReaderWriterLock, UpgradesAfterOtherReadersLeaveAndDowngradesToReading) 
   ASSERT_TRUE(upgrader.Do([&] { lock.ReleaseReaderLock(); }));
   ASSERT_TRUE(lateReader.Do([&] { lock.ReleaseReaderLock(); }));
   ExpectFree(lock);
-}
-
-TEST(CReaderWriterLockNonReentrance, ReadersAndWritersNeverSeeATornUpdate) {
-  CheckNoTornUpdate<CReaderWriterLockNonReentrance>(2);
-}
-
-TEST(CKRReaderWriterLock, ReadersAndWritersNeverSeeATornUpdate) {
-  CheckNoTornUpdate<CKRReaderWriterLock>(5);
 }
 
 TEST(CKRReaderWriterLock, AThreadMayHoldManyLocksAtOnce) {

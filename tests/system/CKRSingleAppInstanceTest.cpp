@@ -9,6 +9,10 @@
 
 namespace {
 
+std::string PrivateFolderName() {
+  return "krCoreLib-" + std::to_string(::geteuid());
+}
+
 // A scratch folder as the runtime and temporary folder of the tests, never
 // the user's own; the environment is put back afterwards.
 class CKRScratchRuntime : public CKRFilesScratch {
@@ -27,6 +31,13 @@ public:
   ~CKRScratchRuntime() {
     for (std::size_t i = 0; i < m_Saved.size(); ++i)
       m_Saved[i] ? ::setenv(kNames[i], m_Saved[i]->c_str(), 1) : ::unsetenv(kNames[i]);
+  }
+
+  // Makes "tmp2" the temporary folder: the path of the private folder in it.
+  std::string UseOtherTemporaryFolder() const {
+    ::mkdir(Native("tmp2").c_str(), 0755);
+    ::setenv("TMPDIR", Native("tmp2").c_str(), 1);
+    return "tmp2/" + PrivateFolderName();
   }
 
 private:
@@ -190,16 +201,13 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   const CKRString id = UniqueID(L"fallback");
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr));
   EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
-  const std::string privateName = "krCoreLib-" + std::to_string(::geteuid());
   struct stat info {};
-  ASSERT_EQ(::lstat(scratch.Native(privateName).c_str(), &info), 0);
+  ASSERT_EQ(::lstat(scratch.Native(PrivateFolderName()).c_str(), &info), 0);
   EXPECT_EQ(info.st_mode & 0777, 0700u);
 
   // ... and a folder of that name that is not private is not used: a link,
-  // one open to others, or one of another user.
-  scratch.MakeFolder("tmp2");
-  ::setenv("TMPDIR", scratch.Native("tmp2").c_str(), 1);
-  const std::string unsafe = "tmp2/" + privateName;
+  // or one open to others (one of another user: next test).
+  const std::string unsafe = scratch.UseOtherTemporaryFolder();
   scratch.MakeLink(scratch.Native("run"), unsafe);
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"unsafe").GetString(), 0, nullptr));
   EXPECT_FALSE(listener.Start(UniqueID(L"unsafe").GetString(), nullptr, nullptr));
@@ -207,17 +215,25 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   scratch.MakeFolder(unsafe);
   ::chmod(scratch.Native(unsafe).c_str(), 0770);
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"open").GetString(), 0, nullptr));
-  if (KRCanActAsAnotherUser()) {
-    ::chmod(scratch.Native(unsafe).c_str(), 0700);
-    ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), KRAnotherUser(), KRAnotherUser()), 0);
-    EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"other's").GetString(), 0, nullptr));
-    // A runtime folder of another user is passed over for the private one.
-    ASSERT_EQ(::chown(scratch.Native("run").c_str(), KRAnotherUser(), KRAnotherUser()), 0);
-    ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
-    ::setenv("TMPDIR", scratch.Native().c_str(), 1);
-    EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"passed over").GetString(), 0, nullptr));
-    EXPECT_EQ(DetectInChild(UniqueID(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
-  }
+}
+
+TEST(CKRSingleAppInstance, FoldersOfAnotherUserAreNotUsed) {
+  if (!KRCanActAsAnotherUser())
+    GTEST_SKIP() << "needs root to give folders to a second user";
+  CKRScratchRuntime scratch;
+  // A private folder of another user is refused ...
+  ::unsetenv("XDG_RUNTIME_DIR");
+  const std::string unsafe = scratch.UseOtherTemporaryFolder();
+  ::mkdir(scratch.Native(unsafe).c_str(), 0700);
+  ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), KRAnotherUser(), KRAnotherUser()), 0);
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"other's").GetString(), 0, nullptr));
+  // ... and a runtime folder of another user is passed over for the
+  // private one.
+  ASSERT_EQ(::chown(scratch.Native("run").c_str(), KRAnotherUser(), KRAnotherUser()), 0);
+  ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
+  ::setenv("TMPDIR", scratch.Native().c_str(), 1);
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"passed over").GetString(), 0, nullptr));
+  EXPECT_EQ(DetectInChild(UniqueID(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
 }
 
 // Shared memory that another user planted under the application ID: the

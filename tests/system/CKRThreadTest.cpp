@@ -12,7 +12,6 @@ using krtest::CGate;
 using krtest::kGenerousSteps;
 using krtest::kNotStopped;
 using krtest::Stopped;
-using krtest::UntilStop;
 
 TEST(CKRThread, RunsItsHandlerAndStartsAgainAfterItEnded) {
   std::atomic<int> runs{0};
@@ -42,10 +41,16 @@ TEST(CKRThread, RunsItsHandlerAndStartsAgainAfterItEnded) {
     }
     started[run - 1].Open();
     EXPECT_EQ(thread.WaitForActivityStatus(5, kGenerousSteps), 1);
+    // A handler that reads no commands is not stopped: at once, or in time.
+    unsigned long exitCode = 1;
+    EXPECT_EQ(thread.Stop(exitCode, run - 1), 0);
+    EXPECT_EQ(exitCode, KRTHREAD_STILL_ACTIVE);
     release[run - 1].Open();
     EXPECT_EQ(thread.WaitForActivityStatus(KRTHREAD_STATUS_IDLE, kGenerousSteps), 1);
     EXPECT_EQ(thread.IsAlive(), 0);
     EXPECT_EQ(thread.GetExitCode(), 10 + run);
+    EXPECT_EQ(thread.Stop(exitCode, 0), 1) << "not running: the last exit code";
+    EXPECT_EQ(exitCode, 10 + run);
     // A status that cannot come any more is not waited for.
     EXPECT_EQ(thread.WaitForActivityStatus(5, KRTHREAD_INFINITE), 0);
   }
@@ -78,28 +83,15 @@ TEST(CKRThread, RepeatedCommandsAreQueuedOnceAndImmediateOnesGoFirst) {
                                         KRTHREAD_CMD_CONTINUE, KRTHREAD_CMD_RUN, KRTHREAD_CMD_RESET}));
 }
 
-TEST(CKRThread, StopEndsAReactingHandlerAndReportsOneThatDoesNotReact) {
-  unsigned long exitCode = 1;
-  CFunctionThread reacting(UntilStop(42));
-  EXPECT_EQ(reacting.Stop(exitCode, 0), 1) << "not running: the last exit code";
-  EXPECT_EQ(exitCode, 0u);
+TEST(CKRThread, StopEndsAHandlerThatReactsAndNeverWaitsOnItsOwnThread) {
+  CFunctionThread reacting([](CFunctionThread& self) -> unsigned long {
+    for (int command = KRTHREAD_CMD_NONE; command != KRTHREAD_CMD_STOP;)
+      self.WaitForNotification(command, KRTHREAD_INFINITE);
+    return 42;
+  });
   reacting.Start();
   EXPECT_EQ(Stopped(reacting), 42u);
   EXPECT_EQ(reacting.GetActivityStatus(), KRTHREAD_STATUS_IDLE);
-
-  CGate release;
-  CFunctionThread deaf([&](CFunctionThread&) -> unsigned long {
-    EXPECT_TRUE(release.Wait());
-    return 8;
-  });
-  deaf.Start();
-  for (const unsigned long steps : {0ul, 1ul}) {
-    EXPECT_EQ(deaf.Stop(exitCode, steps), 0);
-    EXPECT_EQ(exitCode, KRTHREAD_STILL_ACTIVE);
-  }
-  EXPECT_EQ(deaf.IsAlive(), 1);
-  release.Open();
-  EXPECT_EQ(Stopped(deaf), 8u);
 
   // Stop called by the handler on its own thread queues "stop" and returns.
   std::atomic<int> ownStop{-1};
@@ -240,7 +232,8 @@ TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
   EXPECT_EQ(flooded.GetExitCode(), 9u);
 }
 
-TEST(CKRThread, MembersOfASynchronicityGroupExcludeEachOther) {
+TEST(CKRThread, GroupMembersExcludeEachOtherAndARunEndingInsideTheLockReleasesIt) {
+  krtest::CDebugRecorder recorder;
   constexpr int kRounds = 2000;
   std::atomic<int> inside{0};
   std::atomic<bool> overlapped{false};
@@ -258,20 +251,9 @@ TEST(CKRThread, MembersOfASynchronicityGroupExcludeEachOther) {
     return 0;
   };
   CFunctionThread first(body), second(body);
-  first.SetSynchronicity(1, L"counter");
-  second.SetSynchronicity(1, L"counter");
-  first.Start();
-  second.Start();
-  EXPECT_NE(Stopped(first), kNotStopped);
-  EXPECT_NE(Stopped(second), kNotStopped);
-  EXPECT_FALSE(overlapped.load());
-  EXPECT_EQ(shared, 2LL * kRounds);
-}
-
-TEST(CKRThread, ARunEndingInsideItsGroupLockReleasesIt) {
-  krtest::CDebugRecorder recorder;
+  // One member returns holding the lock, one is killed holding it; `member`
+  // stays in the group throughout, so the group lives on.
   CGate locked, memberMayEnd;
-  // One member returns holding the lock, one is killed holding it.
   CFunctionThread returning([&](CFunctionThread& self) -> unsigned long {
     self.Lock();
     return 0;
@@ -281,34 +263,30 @@ TEST(CKRThread, ARunEndingInsideItsGroupLockReleasesIt) {
     locked.Open();
     krtest::IgnoreCommands(self);
   });
-  std::atomic<int> entered{0};
-  CFunctionThread next([&](CFunctionThread& self) -> unsigned long {
-    self.Lock();
-    ++entered;
-    self.Unlock();
-    return 0;
-  });
-  // `member` stays in the group throughout, so the group lives on.
   CFunctionThread member([&](CFunctionThread&) -> unsigned long { return memberMayEnd.Wait() ? 0 : 1; });
-  for (CFunctionThread* thread : {&returning, &killed, &next, &member})
-    thread->SetSynchronicity(1, L"left behind");
+  for (CFunctionThread* thread : {&first, &second, &returning, &killed, &member})
+    thread->SetSynchronicity(1, L"counter");
   member.Start();
+  first.Start();
+  second.Start();
+  EXPECT_NE(Stopped(first), kNotStopped);
+  EXPECT_NE(Stopped(second), kNotStopped);
+  EXPECT_FALSE(overlapped.load());
+  EXPECT_EQ(shared, 2LL * kRounds);
 
   returning.Start();
   EXPECT_NE(Stopped(returning), kNotStopped);
-  next.Start();
-  EXPECT_NE(Stopped(next), kNotStopped);
-  EXPECT_EQ(entered.load(), 1);
-
+  first.Start();
+  EXPECT_NE(Stopped(first), kNotStopped);
   killed.Start();
   ASSERT_TRUE(locked.Wait());
   killed.Kill(1);
-  next.Start();
-  EXPECT_NE(Stopped(next), kNotStopped);
-  EXPECT_EQ(entered.load(), 2);
+  first.Start();
+  EXPECT_NE(Stopped(first), kNotStopped);
+  EXPECT_EQ(shared, 4LL * kRounds);
   memberMayEnd.Open();
   EXPECT_NE(Stopped(member), kNotStopped);
-  // Each ending thread reports it, just after its run ended.
+  // Each thread ending inside the lock reports it, just after its run ended.
   EXPECT_TRUE(krtest::WaitUntil([&] { return recorder.Texts().size() == 2; }));
 }
 

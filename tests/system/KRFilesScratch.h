@@ -16,7 +16,6 @@
 #include <cerrno>
 #include <cmath>
 #include <cstdio>
-#include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>

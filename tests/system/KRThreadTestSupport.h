@@ -180,13 +180,4 @@ inline unsigned long Stopped(CKRThread& thread) {
     self.WaitForNotification(command, timeout);
 }
 
-// Runs until "stop" arrives, then ends with `exitCode`.
-inline CFunctionThread::Body UntilStop(unsigned long exitCode) {
-  return [exitCode](CFunctionThread& self) -> unsigned long {
-    for (int command = KRTHREAD_CMD_NONE; command != KRTHREAD_CMD_STOP;)
-      self.WaitForNotification(command, KRTHREAD_INFINITE);
-    return exitCode;
-  };
-}
-
 }  // namespace krtest

@@ -19,7 +19,8 @@
 //    instance reads the name (MapExistingMemory) and answers "krCoreLibFP"
 //    ("krCoreLibFP -" when it could not read it).
 // The runtime folder is $XDG_RUNTIME_DIR, or a private folder
-// "krCoreLib-<uid>" in $TMPDIR or /tmp when that is not set.
+// "krCoreLib-<uid>" in $TMPDIR or /tmp when that is not set or is not a
+// folder of the user's that nobody else may enter.
 //
 // Security: folders, lock files and shared memory are used only when they
 // belong to the effective user and nobody else may use them (a folder or
