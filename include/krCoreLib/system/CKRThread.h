@@ -82,9 +82,9 @@ enum _EKRThreadPriority : int {
 };
 
 // Exit code reported while the thread runs.
-inline constexpr unsigned long KRTHREAD_STILL_ACTIVE = 259;
+KRCORELIB_LOCAL inline constexpr unsigned long KRTHREAD_STILL_ACTIVE = 259;
 // Wait without limit.
-inline constexpr unsigned long KRTHREAD_INFINITE = 0xFFFFFFFF;
+KRCORELIB_LOCAL inline constexpr unsigned long KRTHREAD_INFINITE = 0xFFFFFFFF;
 
 // Error types of CKRThreadException.
 enum _EKRThreadErrors : int {
