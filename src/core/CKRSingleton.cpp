@@ -1,6 +1,9 @@
 #include <krCoreLib/core/CKRSingleton.h>
 
 #include <algorithm>
+#include <map>
+#include <memory>
+#include <string>
 #include <vector>
 
 namespace {
@@ -12,6 +15,9 @@ namespace {
 struct SKRSingletonRegistry {
   std::recursive_mutex m_Lock;
   std::vector<CKRSingleton*> m_Live;
+  // The instance slots by singleton class name. A slot outlives the module
+  // of its class: a module loaded again finds its empty slot.
+  std::map<std::string, std::unique_ptr<std::atomic<CKRSingleton*>>, std::less<>> m_Slots;
 };
 
 SKRSingletonRegistry& Registry() {
@@ -47,6 +53,17 @@ void CKRSingleton::Detach() {
 void CKRSingleton::ClearSlot(Slot& slot) noexcept {
   CKRSingleton* self = this;
   slot.compare_exchange_strong(self, nullptr, std::memory_order_acq_rel);
+}
+
+CKRSingleton::Slot* CKRSingleton::FindSlot(const char* typeName) {
+  if (typeName == nullptr)
+    return nullptr;
+  SKRSingletonRegistry& registry = Registry();
+  std::lock_guard<std::recursive_mutex> guard(registry.m_Lock);
+  std::unique_ptr<Slot>& slot = registry.m_Slots[typeName];
+  if (slot == nullptr)
+    slot = std::make_unique<Slot>(nullptr);
+  return slot.get();
 }
 
 void CKRSingleton::Publish(CKRSingleton* created, Slot& slot) {

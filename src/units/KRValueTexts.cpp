@@ -22,6 +22,9 @@ constexpr int kMaxDecimalPlaces = 1000;
 
 }  // namespace
 
+int CKRPrecision::m_iDecimalPlaces = 3;
+bool CKRPrecision::m_bRemoveTrailingZeros = false;
+
 CKRString CKRPrecision::GetFormatString() {
   const int places = std::clamp(m_iDecimalPlaces, 0, kMaxDecimalPlaces);
   return CKRString::Formatted(m_bRemoveTrailingZeros ? L"%%.%ig" : L"%%.%if", places);

@@ -1,6 +1,7 @@
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 
 #include "KRTestObjects.h"
+#include "KRTestPlugin.h"
 
 #include <gtest/gtest.h>
 
@@ -164,33 +165,44 @@ TEST_F(CKRTypeSystemTest, DestroyedTypeLeavesNoDanglingLinks) {
   EXPECT_EQ(orphan.IsTypeOf(kChildID), 0);
 }
 
-// A plug-in module built with default options: loaded, claimed, released and
-// unloaded three times, its type is found after every load, and the loader
-// really unmaps it. Then the same while the loader keeps it mapped
-// (RTLD_NODELETE): its static type object is never constructed again, and
-// still its type comes back with the next Initialize.
+// A plug-in module built with default options, which uses interface and
+// data-type IDs, a storable class and a singleton of its own: loaded,
+// claimed, used, released and unloaded three times, its types are found after
+// every load, and the loader really unmaps it. Then the same while the loader
+// keeps it mapped (RTLD_NODELETE): its static type objects are never
+// constructed again, and still its types come back with the next Initialize.
 TEST_F(CKRTypeSystemTest, PluginModuleTypesComeBackAfterReload) {
-  constexpr CKRGuid kPluginTypeID = CKRGuid::Literal("{7C0D2E1F-0000-4000-8000-0000000000A1}");
+  using namespace KRTestPlugin;
   CKRTypeSystem::Initialize(kHostRepository);
+  CKRTestSharedSingleton* shared = CKRTestSharedSingleton::GetInstance();
   for (const bool keepMapped : {false, true}) {
     for (int round = 0; round < 3; ++round) {
       SCOPED_TRACE(testing::Message() << "keep mapped " << keepMapped << ", round " << round);
       void* module = dlopen(KR_TEST_PLUGIN_PATH, RTLD_NOW | RTLD_LOCAL | (keepMapped ? RTLD_NODELETE : 0));
       ASSERT_NE(module, nullptr) << dlerror();
+      auto use = reinterpret_cast<UseFunction>(dlsym(module, kUseFunctionName));
+      auto sharedInModule = reinterpret_cast<SharedFunction>(dlsym(module, kSharedFunctionName));
+      ASSERT_TRUE(use != nullptr && sharedInModule != nullptr);
       CKRTypeSystem::Initialize(kPluginRepository);
-      IKRObjectType* type = CKRTypeSystem::FindType(kPluginTypeID);
-      ASSERT_NE(type, nullptr);
-      EXPECT_EQ(type->GetRepositoryID(), kPluginRepository);
-      EXPECT_EQ(type->IsTypeOf(CKRObjectImpl::TypeID), 1);
-      IKRObject* object = type->CreateInstance(CKRGuid());
+      IKRObjectType* thing = CKRTypeSystem::FindType(kThingTypeID);
+      IKRObjectType* record = CKRTypeSystem::FindType(kRecordTypeID);
+      ASSERT_TRUE(thing != nullptr && record != nullptr);
+      EXPECT_EQ(thing->GetRepositoryID(), kPluginRepository);
+      EXPECT_EQ(thing->IsTypeOf(CKRObjectImpl::TypeID), 1);
+      IKRObject* object = thing->CreateInstance(CKRGuid());
       ASSERT_NE(object, nullptr);
-      EXPECT_EQ(type->GetInstance(object->GetInstanceID()), object);
+      EXPECT_EQ(thing->GetInstance(object->GetInstanceID()), object);
       EXPECT_EQ(object->Release(), 1);
+      IKRObject* stored = record->CreateInstance(CKRGuid());
+      ASSERT_NE(stored, nullptr);
+      EXPECT_EQ(use(stored), 1);
+      EXPECT_EQ(stored->Release(), 1);
+      EXPECT_EQ(sharedInModule(), shared);
       CKRTypeSystem::ReleaseRepository(kPluginRepository);
-      EXPECT_EQ(CKRTypeSystem::FindType(kPluginTypeID), nullptr);
+      EXPECT_TRUE(CKRTypeSystem::FindType(kThingTypeID) == nullptr && CKRTypeSystem::FindType(kRecordTypeID) == nullptr);
       Types derived;
       CKRObjectImpl::GetCKRObjectImplType()->GetDerivedTypes(derived);
-      EXPECT_EQ(std::count(derived.begin(), derived.end(), type), 0);
+      EXPECT_EQ(std::count(derived.begin(), derived.end(), thing), 0);
       ASSERT_EQ(dlclose(module), 0);
       void* still = dlopen(KR_TEST_PLUGIN_PATH, RTLD_NOW | RTLD_NOLOAD);
       EXPECT_EQ(still != nullptr, keepMapped);
@@ -198,4 +210,5 @@ TEST_F(CKRTypeSystemTest, PluginModuleTypesComeBackAfterReload) {
         dlclose(still);
     }
   }
+  CKRTestSharedSingleton::ReleaseInstance();
 }

@@ -14,12 +14,24 @@
 // released after the lock is let go: its destructor may wait for threads
 // that ask for singletons. The registry itself is never destroyed, so
 // ReleaseAll is safe from any exit handler, however early it was registered.
+//
+// One instance per process, whichever modules ask: the instance slots live
+// in the library, one per singleton class, found by the class's type name
+// (typeid(TClass).name()). Each module only caches where its classes' slots
+// are, in hidden variables. So a plug-in that defines a singleton of its own
+// carries no process-wide unique symbol and can be unloaded (after releasing
+// its singletons), and a singleton class whose GetInstance is compiled into
+// several modules (one of the library's, say) still has one instance. A
+// singleton class must therefore have a name of its own in the process: two
+// classes of the same name in different modules (in anonymous namespaces,
+// for example) would share one slot.
 #pragma once
 
 #include <krCoreLib/core/KRExport.h>
 
 #include <atomic>
 #include <mutex>
+#include <typeinfo>
 
 class KRCORELIB_API CKRSingleton {
 public:
@@ -47,6 +59,10 @@ protected:
 
   // The instance slot of GetInstance.
   using Slot = std::atomic<CKRSingleton*>;
+  // The process-wide slot of the singleton class named `typeName` (a type
+  // name as given by std::type_info::name), created empty on first request
+  // and never destroyed. Null `typeName`: null.
+  static Slot* FindSlot(const char* typeName);
   // Makes `created` the instance of `slot` (under the lock).
   static void Publish(CKRSingleton* created, Slot& slot);
   // Takes the instance of `slot` out of the slot and the registry and
@@ -67,33 +83,44 @@ class KRCORELIB_API CKRSingletonT : public TBase {
 public:
   // The instance, created on first use.
   static TClass* GetInstance() {
-    CKRSingleton* instance = m_pInstance.load(std::memory_order_acquire);
+    CKRSingleton::Slot& slot = InstanceSlot();
+    CKRSingleton* instance = slot.load(std::memory_order_acquire);
     if (instance != nullptr)
       return static_cast<TClass*>(instance);
     std::lock_guard<std::recursive_mutex> guard(CKRSingleton::GetLock());
-    instance = m_pInstance.load(std::memory_order_relaxed);
+    instance = slot.load(std::memory_order_relaxed);
     if (instance == nullptr) {
       TClass* created = new TClass();
-      CKRSingleton::Publish(created, m_pInstance);
+      CKRSingleton::Publish(created, slot);
       return created;
     }
     return static_cast<TClass*>(instance);
   }
 
   // True when the instance exists; never creates it.
-  static bool HasInstance() noexcept { return m_pInstance.load(std::memory_order_acquire) != nullptr; }
+  static bool HasInstance() { return InstanceSlot().load(std::memory_order_acquire) != nullptr; }
 
   // Releases the instance if it exists; a later GetInstance creates a new one.
-  static void ReleaseInstance() { CKRSingleton::ReleaseSlot(m_pInstance); }
+  static void ReleaseInstance() { CKRSingleton::ReleaseSlot(InstanceSlot()); }
 
 protected:
   CKRSingletonT() = default;
   // However the instance ends (ReleaseInstance, ReleaseAll or a derived
   // Release, or a plain delete), the next GetInstance must not see it.
-  ~CKRSingletonT() override { this->ClearSlot(m_pInstance); }
+  ~CKRSingletonT() override { this->ClearSlot(InstanceSlot()); }
 
 private:
-  // Kept as the base class, so that the base can empty it and no cast to
-  // TClass is needed where the TClass part has already been destroyed.
-  static inline CKRSingleton::Slot m_pInstance{nullptr};
+  // The library's slot of TClass, looked up once per module. The cache is a
+  // local of a hidden function, one per module: a static data member would
+  // be a process-wide unique symbol (g++ ignores visibility attributes on
+  // static data members of class templates) that pins a plug-in in memory.
+  KRCORELIB_LOCAL static CKRSingleton::Slot& InstanceSlot() {
+    static std::atomic<CKRSingleton::Slot*> s_pSlot{nullptr};
+    CKRSingleton::Slot* slot = s_pSlot.load(std::memory_order_acquire);
+    if (slot == nullptr) {
+      slot = CKRSingleton::FindSlot(typeid(TClass).name());
+      s_pSlot.store(slot, std::memory_order_release);
+    }
+    return *slot;
+  }
 };

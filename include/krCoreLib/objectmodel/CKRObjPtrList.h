@@ -8,15 +8,15 @@
 //
 // Cost: Add, Contains and Remove of an element take constant time on
 // average. The elements sit in an array of nodes linked in list order, found
-// through an open-addressing hash index of node numbers: 16 bytes a node and
-// at most 8 an index slot, so a million elements stay within a processor's
-// last-level cache. Find by instance ID walks the list, since an element's
+// through an open-addressing hash index of node numbers and hash bits:
+// 16 bytes a node and at most 16 of index. Find by instance ID walks the list, since an element's
 // instance ID may change while it is listed. Removing an element leaves
 // iterators at other positions valid. At most 2^32 - 2 elements.
 #pragma once
 
 #include <krCoreLib/objectmodel/IKRCollection.h>
 
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <iterator>
@@ -161,7 +161,7 @@ public:
         // after it, since the element may be gone.
         const IKRObject* key = first;
         first->Release();
-        if (const Index slot = FindSlot(key); slot != kNone)
+        if (const std::size_t slot = FindSlot(key); slot != kNoSlot)
           Erase(slot);
       }
     }
@@ -194,15 +194,15 @@ public:
 
   // Unlinks the element; null when it is not listed.
   T* Remove(IKRObject* element) override {
-    const Index slot = FindSlot(element);
-    if (slot == kNone)
+    const std::size_t slot = FindSlot(element);
+    if (slot == kNoSlot)
       return nullptr;
-    T* removed = m_Nodes[m_Slots[slot]].m_pElement;
+    T* removed = m_Nodes[NodeOf(m_Slots[slot])].m_pElement;
     Erase(slot);
     return removed;
   }
 
-  bool Contains(const IKRObject* element) const { return FindSlot(element) != kNone; }
+  bool Contains(const IKRObject* element) const { return FindSlot(element) != kNoSlot; }
 
   Iterator GetIterator() { return Iterator(this); }
   ReverseIterator GetReverseIterator() { return ReverseIterator(this); }
@@ -213,41 +213,66 @@ public:
 private:
   const IKRObject* KeyOf(Index node) const { return m_Nodes[node].m_pElement; }
 
-  // Objects of one 4 KiB page keep their order in neighbouring slots, so
-  // that a walk in allocation order touches the index as it touches memory;
-  // pages are scattered by Fibonacci hashing of the page number, so strided
-  // addresses do not pile up in one run of slots.
-  std::size_t Home(const IKRObject* key) const {
-    const auto address = std::uint64_t(reinterpret_cast<std::uintptr_t>(key));
-    const std::uint64_t page = ((address >> 12) * 0x9E3779B97F4A7C15ull) >> 32;
-    return std::size_t(page + ((address >> 4) & 0xFF)) & (m_Slots.size() - 1);
+  // An index slot holds a node number in its low half and the high half of
+  // its element's hash in its high half, so that probes and the shifts of
+  // Erase compare and place entries without reading the nodes (each read of
+  // a node is a cache miss in a large list).
+  using Entry = std::uint64_t;
+  static constexpr Entry kEmpty = ~Entry(0);
+  static constexpr std::size_t kNoSlot = ~std::size_t(0);
+  static Index NodeOf(Entry entry) { return Index(entry); }
+
+  // The pointer fully mixed (the finalizer of SplitMix64, constants from
+  // Steele, Lea and Flood, "Fast splittable pseudorandom number generators",
+  // 2014). Heap addresses are anything but random: objects of one size sit
+  // at fixed strides in runs of pages, and a home that keeps neighbours near
+  // each other lets the runs of a large list merge into long probe sequences.
+  static std::uint64_t Mix(const IKRObject* key) {
+    std::uint64_t mixed = std::uint64_t(reinterpret_cast<std::uintptr_t>(key));
+    mixed = (mixed ^ (mixed >> 30)) * 0xBF58476D1CE4E5B9ull;
+    mixed = (mixed ^ (mixed >> 27)) * 0x94D049BB133111EBull;
+    return mixed ^ (mixed >> 31);
+  }
+  static Entry MakeEntry(std::uint64_t mixed, Index node) { return (mixed & ~Entry(0xFFFFFFFF)) | node; }
+
+  // Bits of the index size; the index has at least 8 slots.
+  unsigned SizeBits() const { return unsigned(std::bit_width(m_Slots.size() - 1)); }
+  // The home slot: the high bits of the mixed pointer.
+  std::size_t Home(std::uint64_t mixed) const { return std::size_t(mixed >> (64 - SizeBits())); }
+  std::size_t HomeOf(Entry entry) const {
+    // The entry keeps 32 bits of the hash, enough for indexes of up to 2^32
+    // slots; a larger one hashes the element again.
+    return SizeBits() <= 32 ? Home(entry) : Home(Mix(KeyOf(NodeOf(entry))));
   }
 
-  // The index slot holding `key`, or kNone.
-  Index FindSlot(const IKRObject* key) const {
+  // The index slot holding `key`, or kNoSlot.
+  std::size_t FindSlot(const IKRObject* key) const {
     if (key == nullptr || m_Count == 0)
-      return kNone;
+      return kNoSlot;
+    const std::uint64_t mixed = Mix(key);
+    const Entry tag = MakeEntry(mixed, 0);
     const std::size_t mask = m_Slots.size() - 1;
-    for (std::size_t slot = Home(key);; slot = (slot + 1) & mask) {
-      const Index node = m_Slots[slot];
-      if (node == kNone)
-        return kNone;
-      if (KeyOf(node) == key)
-        return Index(slot);
+    for (std::size_t slot = Home(mixed);; slot = (slot + 1) & mask) {
+      const Entry entry = m_Slots[slot];
+      if (entry == kEmpty)
+        return kNoSlot;
+      if (MakeEntry(entry, 0) == tag && KeyOf(NodeOf(entry)) == key)
+        return slot;
     }
   }
 
   // Enters node `at` into the index (linear probing; at most half full).
   void Place(Index at) {
+    const std::uint64_t mixed = Mix(KeyOf(at));
     const std::size_t mask = m_Slots.size() - 1;
-    std::size_t slot = Home(KeyOf(at));
-    while (m_Slots[slot] != kNone)
+    std::size_t slot = Home(mixed);
+    while (m_Slots[slot] != kEmpty)
       slot = (slot + 1) & mask;
-    m_Slots[slot] = at;
+    m_Slots[slot] = MakeEntry(mixed, at);
   }
 
   void Rehash(std::size_t slots) {
-    m_Slots.assign(slots, kNone);
+    m_Slots.assign(slots, kEmpty);
     for (Index at = m_First; at != kNone; at = m_Nodes[at].m_Next)
       Place(at);
   }
@@ -255,8 +280,8 @@ private:
   // Unlinks the node in index slot `slot`, frees it and closes the gap in
   // the probe sequence by shifting later entries back (no tombstones, so
   // lookups never slow down after many removals).
-  void Erase(Index slot) {
-    const Index at = m_Slots[slot];
+  void Erase(std::size_t slot) {
+    const Index at = NodeOf(m_Slots[slot]);
     SKRNode& node = m_Nodes[at];
     (node.m_Prev != kNone ? m_Nodes[node.m_Prev].m_Next : m_First) = node.m_Next;
     (node.m_Next != kNone ? m_Nodes[node.m_Next].m_Prev : m_Last) = node.m_Prev;
@@ -266,8 +291,8 @@ private:
 
     const std::size_t mask = m_Slots.size() - 1;
     std::size_t hole = slot;
-    for (std::size_t next = (hole + 1) & mask; m_Slots[next] != kNone; next = (next + 1) & mask) {
-      const std::size_t home = Home(KeyOf(m_Slots[next]));
+    for (std::size_t next = (hole + 1) & mask; m_Slots[next] != kEmpty; next = (next + 1) & mask) {
+      const std::size_t home = HomeOf(m_Slots[next]);
       // The entry at `next` may move into the hole unless its home lies
       // cyclically in (hole, next].
       const bool staysPut = hole <= next ? (hole < home && home <= next) : (hole < home || home <= next);
@@ -276,7 +301,7 @@ private:
         hole = next;
       }
     }
-    m_Slots[hole] = kNone;
+    m_Slots[hole] = kEmpty;
   }
 
   void Clear() noexcept {
@@ -289,7 +314,7 @@ private:
   }
 
   std::vector<SKRNode> m_Nodes;
-  std::vector<Index> m_Slots;  // node numbers; kNone is empty; a power of two
+  std::vector<Entry> m_Slots;  // see Entry; kEmpty is empty; a power of two
   Index m_First = kNone;
   Index m_Last = kNone;
   Index m_FreeNode = kNone;

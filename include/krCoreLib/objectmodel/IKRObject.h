@@ -10,7 +10,10 @@
 
 class IKRObjectType;
 
-// Interface ID of IKRObject.
+// Interface ID of IKRObject. The ID constants of the public headers are
+// hidden: every module has its own copy (equal values, different addresses).
+// Shared between modules they would be process-wide unique symbols, and a
+// plug-in that uses one could then never be unmapped.
 KRCORELIB_LOCAL inline constexpr CKRGuid IID_IKRObject = CKRGuid::Literal("{95E11590-E209-41B1-811A-263330087175}");
 
 class KRCORELIB_API IKRUnknown {

@@ -41,7 +41,8 @@ enum KRF_NOTIFICATION_TYPE : int {
 };
 
 // Data type IDs of fields (IKRField::GetDataTypeID): what a value is, so that
-// stores and the property grid choose its representation.
+// stores and the property grid choose its representation. Hidden, one copy
+// per module, as the interface IDs (IKRObject.h).
 KRCORELIB_LOCAL inline constexpr CKRGuid KRDT_STRING = CKRGuid::Literal("{9FD8ACE1-6007-4A97-BB0A-01A0E7999305}");
 KRCORELIB_LOCAL inline constexpr CKRGuid KRDT_GUID = CKRGuid::Literal("{B95F42C3-073B-4A29-A52D-D30B7DD68D89}");
 KRCORELIB_LOCAL inline constexpr CKRGuid KRDT_INTEGER = CKRGuid::Literal("{D5F60C41-B258-4282-BF90-4CCD3026D817}");
