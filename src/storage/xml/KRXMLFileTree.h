@@ -1,0 +1,62 @@
+// The XML store's private side: the tree an open archive holds, the
+// parser that read it, and the conversions between the opaque element
+// handles of the public headers and the XML library's elements.
+#pragma once
+
+#include <krCoreLib/objectmodel/CKRGuid.h>
+
+#include "CKRXString.h"
+
+#include <xercesc/dom/DOMDocument.hpp>
+#include <xercesc/dom/DOMElement.hpp>
+#include <xercesc/parsers/XercesDOMParser.hpp>
+
+#include <memory>
+
+struct SKRXMLFileElement;  // never defined: a DOMElement seen from outside
+
+struct SKRXMLFileTree {
+  SKRXMLFileTree() = default;
+  ~SKRXMLFileTree();
+  SKRXMLFileTree(const SKRXMLFileTree&) = delete;
+  SKRXMLFileTree& operator=(const SKRXMLFileTree&) = delete;
+
+  xercesc::DOMDocument* m_pDocument = nullptr;  // owned (adopted from the parser when read)
+  std::unique_ptr<xercesc::XercesDOMParser> m_pParser;  // reading only
+};
+
+inline xercesc::DOMElement* KRToDOM(SKRXMLFileElement* element) {
+  return reinterpret_cast<xercesc::DOMElement*>(element);
+}
+inline SKRXMLFileElement* KRFromDOM(xercesc::DOMElement* element) {
+  return reinterpret_cast<SKRXMLFileElement*>(element);
+}
+
+// Element names and attribute values of the file format.
+struct SKRXMLFileNames {
+  // The element form of `id`: "_" and 22 characters of XML64.
+  static CKRString ElementForm(const CKRGuid& id) { return id.GetCStringXMLElement(); }
+  // The GUID an element's name is the element form of; null when it is none
+  // (wrong length, characters outside the alphabet, the null GUID).
+  static CKRGuid FromElementName(const XMLCh* name);
+  // The GUID of an XML64 attribute value; null when it is none.
+  static CKRGuid FromXML64(const XMLCh* value);
+};
+
+// A new element named by `id`'s element form, appended to `parent`; null
+// when either is missing or the element cannot be made.
+xercesc::DOMElement* KRAppendGuidElement(xercesc::DOMDocument* document, xercesc::DOMElement* parent, const CKRGuid& id);
+
+// Calls `visit` for every element child of `parent` that is named by a
+// valid GUID, in document order.
+template <typename Visit>
+void KRForEachGuidChild(xercesc::DOMElement* parent, Visit visit) {
+  if (parent == nullptr)
+    return;
+  for (xercesc::DOMElement* child = parent->getFirstElementChild(); child != nullptr;
+       child = child->getNextElementSibling()) {
+    const CKRGuid id = SKRXMLFileNames::FromElementName(child->getTagName());
+    if (id.IsValid())
+      visit(id, child);
+  }
+}
