@@ -70,6 +70,15 @@ public:
   }
   bool Failed() const { return m_FatalErrors > 0; }
 
+  // Every element name passes through the tree's name table; it grows
+  // with the tree (see KRNoteNewName).
+  void startElement(const XMLElementDecl& declaration, const unsigned int urlId, const XMLCh* const prefix,
+                    const RefVectorOf<XMLAttr>& attributes, const XMLSize_t count, const bool isEmpty,
+                    const bool isRoot) override {
+    KRNoteNewName(getDocument(), m_Names);
+    XercesDOMParser::startElement(declaration, urlId, prefix, attributes, count, isEmpty, isRoot);
+  }
+
   void doctypeDecl(const DTDElementDecl&, const XMLCh* const, const XMLCh* const, const bool, const bool) override {
     throw SKRDoctypeRefused();
   }
@@ -87,6 +96,7 @@ private:
 
   SecurityManager m_Security;
   int m_FatalErrors = 0;
+  std::size_t m_Names = 0;
 };
 
 // The writer's error handler: the writer always continues, and an error

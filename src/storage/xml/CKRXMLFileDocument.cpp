@@ -13,8 +13,8 @@ void CKRXMLFileDocument::SetArchive(CKRXMLFileArchive* archive) {
   m_pArchive = archive;
   if (archive == nullptr || archive->GetAccessMode() != CKRArchive::AccessWrite || archive->m_pTree == nullptr)
     return;
-  DOMDocument* tree = archive->m_pTree->m_pDocument;
-  m_pElement = KRFromDOM(KRAppendGuidElement(tree, tree->getDocumentElement(), GetInstanceID()));
+  SKRXMLFileTree* tree = archive->m_pTree;
+  m_pElement = KRFromDOM(KRAppendGuidElement(tree, tree->m_pDocument->getDocumentElement(), GetInstanceID()));
 }
 
 CKRTypeManifest* CKRXMLFileDocument::CreateTypeManifest(CKRGuid typeID, IKRObjectType* manifestType) {

@@ -101,7 +101,7 @@ int CKRXMLFileFieldStream::WriteObjectHeader(IKRObject* object) {
   if (m_pElement != nullptr || object == nullptr || m_pManifest == nullptr || m_pArchive == nullptr ||
       m_pArchive->m_pTree == nullptr)
     return 0;
-  DOMElement* element = KRAppendGuidElement(m_pArchive->m_pTree->m_pDocument, KRToDOM(m_pManifest->GetElement()),
+  DOMElement* element = KRAppendGuidElement(m_pArchive->m_pTree, KRToDOM(m_pManifest->GetElement()),
                                             object->GetInstanceID());
   if (element == nullptr)
     return 0;
@@ -121,16 +121,15 @@ int CKRXMLFileFieldStream::ReadObjectHeader(IKRObject* object) {
 
 // The field's element, new and appended to the object's: null when the
 // stream has no object element or the field no ID.
-static DOMElement* AppendFieldElement(CKRXMLFileArchive* archive, SKRXMLFileElement* objectElement, IKRField* field) {
-  if (archive == nullptr || archive->GetAccessMode() == 0 || field == nullptr)
+static DOMElement* AppendFieldElement(SKRXMLFileTree* tree, SKRXMLFileElement* objectElement, IKRField* field) {
+  if (field == nullptr)
     return nullptr;
-  DOMElement* parent = KRToDOM(objectElement);
-  return parent != nullptr ? KRAppendGuidElement(parent->getOwnerDocument(), parent, field->GetFieldID()) : nullptr;
+  return KRAppendGuidElement(tree, KRToDOM(objectElement), field->GetFieldID());
 }
 
 int CKRXMLFileFieldStream::Write(IKRFieldData* fieldData) {
   IKRField* field = FieldOf(fieldData);
-  DOMElement* element = AppendFieldElement(m_pArchive, m_pElement, field);
+  DOMElement* element = AppendFieldElement(m_pArchive != nullptr ? m_pArchive->m_pTree : nullptr, m_pElement, field);
   if (element == nullptr)
     return 0;
   if (field->SupportsStringStorage() != 0) {
@@ -141,7 +140,7 @@ int CKRXMLFileFieldStream::Write(IKRFieldData* fieldData) {
 }
 
 int CKRXMLFileFieldStream::WriteLink(IKRFieldData* fieldData, IKRObject* object) {
-  DOMElement* element = AppendFieldElement(m_pArchive, m_pElement, FieldOf(fieldData));
+  DOMElement* element = AppendFieldElement(m_pArchive != nullptr ? m_pArchive->m_pTree : nullptr, m_pElement, FieldOf(fieldData));
   if (element == nullptr)
     return 0;
   if (object != nullptr)
@@ -150,7 +149,7 @@ int CKRXMLFileFieldStream::WriteLink(IKRFieldData* fieldData, IKRObject* object)
 }
 
 int CKRXMLFileFieldStream::WriteLinks(IKRFieldData* fieldData, IKRIterator* iterator) {
-  DOMElement* element = AppendFieldElement(m_pArchive, m_pElement, FieldOf(fieldData));
+  DOMElement* element = AppendFieldElement(m_pArchive != nullptr ? m_pArchive->m_pTree : nullptr, m_pElement, FieldOf(fieldData));
   if (element == nullptr)
     return 0;
   if (iterator == nullptr)

@@ -20,7 +20,7 @@ int CKRXMLFileTypeManifest::WriteTypeHeader(IKRObjectType* type) {
   if (m_pArchive == nullptr || m_pArchive->m_pTree == nullptr || m_pXMLDocument == nullptr)
     return 0;
   const CKRGuid typeID = type != nullptr ? type->GetID() : GetStoredTypeID();
-  DOMElement* element = KRAppendGuidElement(m_pArchive->m_pTree->m_pDocument, KRToDOM(m_pXMLDocument->GetElement()), typeID);
+  DOMElement* element = KRAppendGuidElement(m_pArchive->m_pTree, KRToDOM(m_pXMLDocument->GetElement()), typeID);
   if (element == nullptr)
     return 0;
   m_pElement = KRFromDOM(element);
@@ -36,8 +36,9 @@ CKRFieldStream* CKRXMLFileTypeManifest::CreateFieldStream(CKRGuid instanceID, IK
     return CKRTypeManifest::CreateFieldStream(instanceID, streamType);
   CKRFieldStream* stream =
       CKRTypeManifest::CreateFieldStream(instanceID, CKRXMLFileFieldStream::GetCKRXMLFileFieldStreamType());
-  if (auto* xml = dynamic_cast<CKRXMLFileFieldStream*>(stream))
-    xml->SetManifest(this);
+  // Made by the stream type of this store: its class.
+  if (stream != nullptr)
+    static_cast<CKRXMLFileFieldStream*>(stream)->SetManifest(this);
   return stream;
 }
 

@@ -1,6 +1,10 @@
 #include "KRXMLFileTree.h"
 
+#include <xercesc/dom/impl/DOMDocumentImpl.hpp>
+#include <xercesc/dom/impl/DOMStringPool.hpp>
 #include <xercesc/util/XMLString.hpp>
+
+#include <cstring>
 
 XERCES_CPP_NAMESPACE_USE
 
@@ -28,7 +32,58 @@ CKRGuid FromXML64Characters(const XMLCh* text) {
   return id;
 }
 
+// The name table of a tree is private to the library's document class;
+// an explicit instantiation may name private members (the language allows
+// it there), and hands their member pointers out through a friend.
+struct SKRNameTableTag {
+  using Type = DOMStringPoolEntry** DOMDocumentImpl::*;
+  friend Type KRMemberOf(SKRNameTableTag);
+};
+struct SKRNameTableSizeTag {
+  using Type = XMLSize_t DOMDocumentImpl::*;
+  friend Type KRMemberOf(SKRNameTableSizeTag);
+};
+template <typename Tag, typename Tag::Type Member>
+struct SKRMemberAccess {
+  friend typename Tag::Type KRMemberOf(Tag) { return Member; }
+};
+template struct SKRMemberAccess<SKRNameTableTag, &DOMDocumentImpl::fNameTable>;
+template struct SKRMemberAccess<SKRNameTableSizeTag, &DOMDocumentImpl::fNameTableSize>;
+
+// Names per chain before the table grows, and the growth factor.
+constexpr std::size_t kNamesPerChain = 4;
+constexpr std::size_t kGrowth = 8;
+
 }  // namespace
+
+void KRNoteNewName(DOMDocument* document, std::size_t& names) {
+  ++names;
+  // Every document the library makes is its DOMDocumentImpl.
+  auto* implementation = static_cast<DOMDocumentImpl*>(document);
+  if (implementation == nullptr)
+    return;
+  DOMStringPoolEntry**& table = implementation->*KRMemberOf(SKRNameTableTag());
+  XMLSize_t& size = implementation->*KRMemberOf(SKRNameTableSizeTag());
+  if (table == nullptr || names <= size * kNamesPerChain)
+    return;
+  // Odd sizes spread the library's hash better than powers of two.
+  const XMLSize_t wider = size * kGrowth + 1;
+  // Allocated in the document's own memory, released with the document
+  // (the old table too, which simply stays unused).
+  auto** chains = static_cast<DOMStringPoolEntry**>(implementation->allocate(wider * sizeof(DOMStringPoolEntry*)));
+  std::memset(chains, 0, wider * sizeof(DOMStringPoolEntry*));
+  for (XMLSize_t i = 0; i < size; ++i) {
+    for (DOMStringPoolEntry* entry = table[i]; entry != nullptr;) {
+      DOMStringPoolEntry* next = entry->fNext;
+      const XMLSize_t chain = XMLString::hash(entry->fString, wider);
+      entry->fNext = chains[chain];
+      chains[chain] = entry;
+      entry = next;
+    }
+  }
+  table = chains;
+  size = wider;
+}
 
 CKRGuid SKRXMLFileNames::FromElementName(const XMLCh* name) {
   if (name == nullptr || name[0] != u'_' || XMLString::stringLen(name) != kElementFormLength)
@@ -42,11 +97,12 @@ CKRGuid SKRXMLFileNames::FromXML64(const XMLCh* value) {
   return FromXML64Characters(value);
 }
 
-DOMElement* KRAppendGuidElement(DOMDocument* document, DOMElement* parent, const CKRGuid& id) {
-  if (document == nullptr || parent == nullptr)
+DOMElement* KRAppendGuidElement(SKRXMLFileTree* tree, DOMElement* parent, const CKRGuid& id) {
+  if (tree == nullptr || tree->m_pDocument == nullptr || parent == nullptr)
     return nullptr;
   const CKRXString name(SKRXMLFileNames::ElementForm(id));
-  DOMElement* element = document->createElement(name);
+  KRNoteNewName(tree->m_pDocument, tree->m_Names);
+  DOMElement* element = tree->m_pDocument->createElement(name);
   if (element != nullptr)
     parent->appendChild(element);
   return element;

@@ -23,7 +23,16 @@ struct SKRXMLFileTree {
 
   xercesc::DOMDocument* m_pDocument = nullptr;  // owned (adopted from the parser when read)
   std::unique_ptr<xercesc::XercesDOMParser> m_pParser;  // reading only
+  std::size_t m_Names = 0;  // element names made in m_pDocument, for KRNoteNewName
 };
+
+// The XML library keeps every element name of a tree in one hash table of
+// a fixed 257 chains; the store names every object by its own GUID, so a
+// file of 100,000 objects made saving and loading quadratic (seconds per
+// thousand objects, spent walking those chains). Counting the names of a
+// tree and widening its table as it grows (four names per chain at most)
+// keeps each name's lookup short. `names` counts the names made so far.
+void KRNoteNewName(xercesc::DOMDocument* document, std::size_t& names);
 
 inline xercesc::DOMElement* KRToDOM(SKRXMLFileElement* element) {
   return reinterpret_cast<xercesc::DOMElement*>(element);
@@ -45,7 +54,7 @@ struct SKRXMLFileNames {
 
 // A new element named by `id`'s element form, appended to `parent`; null
 // when either is missing or the element cannot be made.
-xercesc::DOMElement* KRAppendGuidElement(xercesc::DOMDocument* document, xercesc::DOMElement* parent, const CKRGuid& id);
+xercesc::DOMElement* KRAppendGuidElement(SKRXMLFileTree* tree, xercesc::DOMElement* parent, const CKRGuid& id);
 
 // Calls `visit` for every element child of `parent` that is named by a
 // valid GUID, in document order.
