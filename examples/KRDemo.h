@@ -23,3 +23,4 @@ void KRDemoMath();
 void KRDemoGeometry();
 void KRDemoFiles();
 void KRDemoThreads();
+void KRDemoStorage();

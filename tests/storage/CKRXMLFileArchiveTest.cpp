@@ -323,18 +323,7 @@ TEST_F(CKRXMLFileArchiveTest, HostileFilesFailCleanly) {
     KRWriteBytes(path, hostile.m_Bytes);
     SKRXMLLoad load = KRLoadXML(path);
     EXPECT_EQ(load.m_Opened, hostile.m_Opens);
-    // Every stored object that can be asked for, asked for.
-    auto documents = load.m_pArchive->GetDocumentIterator();
-    for (CKRDocument* each = documents.Next(1); each != nullptr; each = documents.Next(0)) {
-      auto manifests = each->GetTypeManifestIterator();
-      for (CKRTypeManifest* manifest = manifests.Next(1); manifest != nullptr; manifest = manifests.Next(0)) {
-        auto streams = manifest->GetInstanceFieldStreamIterator();
-        for (CKRFieldStream* stream = streams.Next(1); stream != nullptr; stream = streams.Next(0))
-          if (IKRObject* object = each->GetObject(stream->GetStoredInstanceID(), manifest->GetStoredTypeID()))
-            object->Release();
-      }
-    }
-    load.Release();
+    KRLoadEverything(load);
   }
 
   // A missing file, a directory and an empty file name.
@@ -412,4 +401,17 @@ TEST_F(CKRXMLFileArchiveTest, FailedSavesKeepTheOldFile) {
   EXPECT_GT(KRReadBytes(path).size(), 200000u);
   EXPECT_EQ(KRFolderEntries(folder).size(), 1u);
   record->Release();
+}
+
+// The inputs kept from fuzzing (tests/storage/fuzz_inputs) load without a
+// crash, a hang or a leak.
+TEST_F(CKRXMLFileArchiveTest, FuzzInputsLoadCleanly) {
+  int inputs = 0;
+  for (const auto& entry : std::filesystem::directory_iterator(KR_FUZZ_INPUTS)) {
+    SCOPED_TRACE(entry.path().filename().string());
+    SKRXMLLoad load = KRLoadXML(entry.path().string());
+    KRLoadEverything(load);
+    ++inputs;
+  }
+  EXPECT_GT(inputs, 0);
 }

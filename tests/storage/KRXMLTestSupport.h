@@ -17,6 +17,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <set>
 #include <sstream>
 #include <string>
 #include <utility>
@@ -102,6 +103,31 @@ inline SKRXMLLoad KRLoadXML(const std::string& path) {
   load.m_pArchive = KRNewXMLArchive(path);
   load.m_Opened = load.m_pArchive->Open(CKRArchive::AccessRead);
   return load;
+}
+
+// Asks the documents for every stored object, then releases the archive
+// and everything that loaded (also through links): what a host does with a
+// file it knows nothing about.
+inline void KRLoadEverything(SKRXMLLoad& load) {
+  std::set<IKRObject*> loaded;
+  for (const bool collect : {false, true}) {
+    auto documents = load.m_pArchive->GetDocumentIterator();
+    for (CKRDocument* each = documents.Next(1); each != nullptr; each = documents.Next(0)) {
+      auto manifests = each->GetTypeManifestIterator();
+      for (CKRTypeManifest* manifest = manifests.Next(1); manifest != nullptr; manifest = manifests.Next(0)) {
+        auto streams = manifest->GetInstanceFieldStreamIterator();
+        for (CKRFieldStream* stream = streams.Next(1); stream != nullptr; stream = streams.Next(0)) {
+          if (!collect)
+            each->GetObject(stream->GetStoredInstanceID(), manifest->GetStoredTypeID());
+          else if (stream->GetResult() != nullptr)
+            loaded.insert(stream->GetResult());
+        }
+      }
+    }
+  }
+  load.Release();
+  for (IKRObject* object : loaded)
+    object->Release();
 }
 
 // The independent reading: an element with its attributes (in file order)

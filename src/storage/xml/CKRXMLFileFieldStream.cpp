@@ -65,10 +65,8 @@ DOMElement* FindOnlyDescendant(DOMElement* parent, const XMLCh* name) {
 
 // Sets "T" and "I" to the linked object's type and instance IDs.
 void SetLinkAttributes(DOMElement* element, IKRObject* object) {
-  const CKRXString typeID(object->GetType()->GetID().GetCStringXML64());
-  const CKRXString instanceID(object->GetInstanceID().GetCStringXML64());
-  element->setAttribute(kTypeID, typeID);
-  element->setAttribute(kInstanceID, instanceID);
+  element->setAttribute(kTypeID, SKRXMLGuidText(object->GetType()->GetID()).XML64());
+  element->setAttribute(kInstanceID, SKRXMLGuidText(object->GetInstanceID()).XML64());
 }
 
 // The object a link element names, through the document: null for an
@@ -171,8 +169,8 @@ int CKRXMLFileFieldStream::Read(IKRFieldData* fieldData) {
     return 0;
   if (field->SupportsStringStorage() == 0)
     return 1;
-  const CKRXString name(SKRXMLFileNames::ElementForm(field->GetFieldID()));
-  DOMElement* element = FindOnlyDescendant(KRToDOM(m_pElement), name);
+  const SKRXMLGuidText name(field->GetFieldID());
+  DOMElement* element = FindOnlyDescendant(KRToDOM(m_pElement), name.ElementForm());
   if (element == nullptr)
     return 0;
   // A missing attribute reads as empty text.
@@ -185,8 +183,8 @@ IKRObject* CKRXMLFileFieldStream::ReadLink(IKRFieldData* fieldData) {
   IKRField* field = FieldOf(fieldData);
   if (field == nullptr)
     return nullptr;
-  const CKRXString name(SKRXMLFileNames::ElementForm(field->GetFieldID()));
-  DOMElement* element = FindOnlyDescendant(KRToDOM(m_pElement), name);
+  const SKRXMLGuidText name(field->GetFieldID());
+  DOMElement* element = FindOnlyDescendant(KRToDOM(m_pElement), name.ElementForm());
   return element != nullptr ? ResolveLink(GetDocument(), element) : nullptr;
 }
 
@@ -194,8 +192,8 @@ int CKRXMLFileFieldStream::ReadLinks(IKRFieldData* fieldData, IKRCollection* col
   IKRField* field = FieldOf(fieldData);
   if (field == nullptr || collection == nullptr)
     return 0;
-  const CKRXString name(SKRXMLFileNames::ElementForm(field->GetFieldID()));
-  DOMElement* element = FindOnlyDescendant(KRToDOM(m_pElement), name);
+  const SKRXMLGuidText name(field->GetFieldID());
+  DOMElement* element = FindOnlyDescendant(KRToDOM(m_pElement), name.ElementForm());
   if (element == nullptr)
     return 0;
   // The "L" descendants in document order.

@@ -1,5 +1,7 @@
 #include "KRXMLFileTree.h"
 
+#include "objectmodel/KRBase64.h"
+
 #include <xercesc/dom/impl/DOMDocumentImpl.hpp>
 #include <xercesc/dom/impl/DOMStringPool.hpp>
 #include <xercesc/util/XMLString.hpp>
@@ -85,6 +87,28 @@ void KRNoteNewName(DOMDocument* document, std::size_t& names) {
   size = wider;
 }
 
+SKRXMLGuidText::SKRXMLGuidText(const CKRGuid& id) {
+  // The memory image of the GUID (its fields little-endian), as CKRGuid
+  // encodes it.
+  const GUID& guid = id.GetGUID();
+  unsigned char bytes[16];
+  for (int i = 0; i < 4; ++i)
+    bytes[i] = static_cast<unsigned char>(guid.Data1 >> (8 * i));
+  for (int i = 0; i < 2; ++i) {
+    bytes[4 + i] = static_cast<unsigned char>(guid.Data2 >> (8 * i));
+    bytes[6 + i] = static_cast<unsigned char>(guid.Data3 >> (8 * i));
+  }
+  std::memcpy(bytes + 8, guid.Data4, 8);
+  // 16 bytes are 22 characters and the padding "==", which is dropped.
+  XMLSize_t at = 0;
+  m_Text[at++] = u'_';
+  SKRBase64::Encode(bytes, sizeof bytes, [&](char c) {
+    if (at <= kXML64Length)
+      m_Text[at++] = XMLCh(c);
+  });
+  m_Text[kElementFormLength] = 0;
+}
+
 CKRGuid SKRXMLFileNames::FromElementName(const XMLCh* name) {
   if (name == nullptr || name[0] != u'_' || XMLString::stringLen(name) != kElementFormLength)
     return CKRGuid();
@@ -100,9 +124,9 @@ CKRGuid SKRXMLFileNames::FromXML64(const XMLCh* value) {
 DOMElement* KRAppendGuidElement(SKRXMLFileTree* tree, DOMElement* parent, const CKRGuid& id) {
   if (tree == nullptr || tree->m_pDocument == nullptr || parent == nullptr)
     return nullptr;
-  const CKRXString name(SKRXMLFileNames::ElementForm(id));
+  const SKRXMLGuidText name(id);
   KRNoteNewName(tree->m_pDocument, tree->m_Names);
-  DOMElement* element = tree->m_pDocument->createElement(name);
+  DOMElement* element = tree->m_pDocument->createElement(name.ElementForm());
   if (element != nullptr)
     parent->appendChild(element);
   return element;

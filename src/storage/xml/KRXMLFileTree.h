@@ -41,10 +41,22 @@ inline SKRXMLFileElement* KRFromDOM(xercesc::DOMElement* element) {
   return reinterpret_cast<SKRXMLFileElement*>(element);
 }
 
+// The two text forms of a GUID in the library's characters, made without
+// allocating (the store writes a few for every object): `m_Text` holds the
+// element form ("_" and 22 characters of XML64), `XML64()` its last 22
+// characters. The same texts as CKRGuid's GetCStringXMLElement and
+// GetCStringXML64.
+struct SKRXMLGuidText {
+  explicit SKRXMLGuidText(const CKRGuid& id);
+  const XMLCh* ElementForm() const { return m_Text; }
+  const XMLCh* XML64() const { return m_Text + 1; }
+
+private:
+  XMLCh m_Text[24];
+};
+
 // Element names and attribute values of the file format.
 struct SKRXMLFileNames {
-  // The element form of `id`: "_" and 22 characters of XML64.
-  static CKRString ElementForm(const CKRGuid& id) { return id.GetCStringXMLElement(); }
   // The GUID an element's name is the element form of; null when it is none
   // (wrong length, characters outside the alphabet, the null GUID).
   static CKRGuid FromElementName(const XMLCh* name);
