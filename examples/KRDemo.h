@@ -18,6 +18,7 @@ inline void PrintSection(const wchar_t* title) {
 
 void KRDemoObjectModel();
 void KRDemoSerialization();
+void KRDemoFramework();
 void KRDemoUnits();
 void KRDemoMath();
 void KRDemoGeometry();

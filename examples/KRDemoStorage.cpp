@@ -10,7 +10,7 @@
 
 namespace {
 
-constexpr CKRGuid kDocumentID = CKRGuid::Literal("{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4B00}");
+constexpr CKRGuid kDocumentID = CKRGuid::Literal("{7E0F1A2B-3C4D-4E5F-8A9B-0C1D2E3F4C00}");
 
 template <typename T>
 T* New(IKRObjectType* type) {

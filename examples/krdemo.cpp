@@ -8,6 +8,8 @@ int main() {
   KRDemoObjectModel();
   PrintSection(L"Fields and storable objects");
   KRDemoSerialization();
+  PrintSection(L"Graphs, walks and preferences");
+  KRDemoFramework();
   PrintSection(L"XML storage: a graph and preferences in one file");
   KRDemoStorage();
   PrintSection(L"Units and engineering values");

@@ -51,9 +51,12 @@
 #include <krCoreLib/platform/KRFileChooser.h>
 
 // Application framework.
+#include <krCoreLib/framework/CKRGraphNode.h>
+#include <krCoreLib/framework/CKRGraphNodeVisitor.h>
 #include <krCoreLib/framework/CKRObservable.h>
 #include <krCoreLib/framework/CKRObservation.h>
 #include <krCoreLib/framework/CKRObserver.h>
+#include <krCoreLib/framework/CKRPreferences.h>
 
 // Units and engineering values.
 #include <krCoreLib/units/CKRColor.h>

@@ -1,5 +1,6 @@
 #include "KRGraphTestObjects.h"
 
+#include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/serialization/CKRFieldT.h>
 
 KR_IMPLEMENT_SERIAL_TYPE(CKRTestPlace, CKRGraphNode)
@@ -12,24 +13,18 @@ KR_IMPLEMENT_OBJECT_TYPE(CKRTestTracingVisitor, CKRDFSVisitor)
 void CKRTestPlace::CKRTestPlaceType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
   AppendParentFields(target, object);
   BindField<CKRFieldT<CKRString>>(target, object, &CKRTestPlace::m_Name, L"Name", L"The place's name",
-                                  KRGraphTestFields::kPlaceName, KRDT_STRING, KRF_READ | KRF_WRITE | KRF_VISIBLE);
+                                  CKRGuid::Literal("{6B000000-0000-4000-8000-000000000001}"), KRDT_STRING,
+                                  KRF_READ | KRF_WRITE | KRF_VISIBLE);
 }
 
-void CKRTestTown::CKRTestTownType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
-  AppendParentFields(target, object);
-}
-
-void CKRTestRoad::CKRTestRoadType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
-  AppendParentFields(target, object);
-}
-
-void CKRTestOneWay::CKRTestOneWayType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
-  AppendParentFields(target, object);
-}
-
-void CKRTestBackWay::CKRTestBackWayType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
-  AppendParentFields(target, object);
-}
+#define KR_TEST_NO_OWN_FIELDS(Class)                                                                   \
+  void Class::Class##Type::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {         \
+    AppendParentFields(target, object);                                                                \
+  }
+KR_TEST_NO_OWN_FIELDS(CKRTestTown)
+KR_TEST_NO_OWN_FIELDS(CKRTestRoad)
+KR_TEST_NO_OWN_FIELDS(CKRTestOneWay)
+KR_TEST_NO_OWN_FIELDS(CKRTestBackWay)
 
 int CKRTestTracingVisitor::VisitNode(CKRGraphNode* node) {
   ++m_Calls;
@@ -43,38 +38,40 @@ int CKRTestTracingVisitor::VisitNode(CKRGraphNode* node) {
   return result;
 }
 
-CKRTestPlace* NewPlace(const wchar_t* name) {
-  auto* place = NewObject<CKRTestPlace>(CKRTestPlace::GetCKRTestPlaceType());
-  if (place != nullptr)
-    place->m_Name = name;
+CKRTestPlace* NewPlace(const wchar_t* name, bool town) {
+  // Storable types get their fields when the type system claims them.
+  static const bool s_Claimed =
+      (CKRTypeSystem::Initialize(CKRGuid::Literal("{6D000000-0000-4000-8000-000000000002}")), true);
+  (void)s_Claimed;
+  auto* place = town ? NewObject<CKRTestPlace>(CKRTestTown::GetCKRTestTownType())
+                     : NewObject<CKRTestPlace>(CKRTestPlace::GetCKRTestPlaceType());
+  place->m_Name = name;
   return place;
 }
 
-CKRTestTown* NewTown(const wchar_t* name) {
-  auto* town = NewObject<CKRTestTown>(CKRTestTown::GetCKRTestTownType());
-  if (town != nullptr)
-    town->m_Name = name;
-  return town;
-}
-
 CKRTestRoad* NewRoad(CKRGraphNode* primary, CKRGraphNode* secondary, CKRGuid typeID) {
-  IKRObjectType* type = typeID == CKRTestOneWay::TypeID    ? static_cast<IKRObjectType*>(CKRTestOneWay::GetCKRTestOneWayType())
-                        : typeID == CKRTestBackWay::TypeID ? static_cast<IKRObjectType*>(CKRTestBackWay::GetCKRTestBackWayType())
-                                                           : static_cast<IKRObjectType*>(CKRTestRoad::GetCKRTestRoadType());
+  IKRObjectType* type = CKRTestRoad::GetCKRTestRoadType();
+  if (typeID == CKRTestOneWay::TypeID)
+    type = CKRTestOneWay::GetCKRTestOneWayType();
+  else if (typeID == CKRTestBackWay::TypeID)
+    type = CKRTestBackWay::GetCKRTestBackWayType();
   auto* road = NewObject<CKRTestRoad>(type);
-  if (road != nullptr && road->SetNodes(primary, secondary) != 0)
+  if (road->SetNodes(primary, secondary) != 0)
     road->Connect();
   return road;
 }
 
 std::string PlaceName(CKRGraphNode* node) {
   auto* place = dynamic_cast<CKRTestPlace*>(node);
-  if (place == nullptr)
-    return "?";
-  std::string name;
-  for (const wchar_t* c = place->m_Name.c_str(); *c != 0; ++c)
-    name += char(*c);
-  return name;
+  return place != nullptr ? place->m_Name.ToUtf8() : "?";
+}
+
+std::vector<CKRGraphEdge*> Edges(CKRGraphNode* node) {
+  std::vector<CKRGraphEdge*> edges;
+  auto it = node->GetEdgeIterator();
+  for (CKRGraphEdge* edge = it.Next(1); edge != nullptr; edge = it.Next(0))
+    edges.push_back(edge);
+  return edges;
 }
 
 std::vector<std::string> Collected(CKRDFSVisitor* visitor) {

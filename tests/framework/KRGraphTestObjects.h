@@ -1,6 +1,7 @@
-// Nodes, edges and visitors for the graph tests: derived node classes,
-// edges that go one way only, a live-object register to find dead edges,
-// and a visitor that records its calls.
+// Nodes, edges and a visitor for the graph tests: derived node classes,
+// roads that go one way (the direction comes with the class, so loaded
+// roads have it too), a register of live nodes and edges to find dead
+// ones, and a visitor that logs its calls.
 #pragma once
 
 #include <krCoreLib/framework/CKRGraphNodeVisitor.h>
@@ -10,17 +11,14 @@
 #include <string>
 #include <vector>
 
-namespace KRGraphTestFields {
-inline constexpr CKRGuid kPlaceName = CKRGuid::Literal("{6B000000-0000-4000-8000-000000000001}");
-}  // namespace KRGraphTestFields
-
-// Every node and edge of the test classes alive now.
 inline std::set<const IKRObject*>& KRLiveGraphObjects() {
   static std::set<const IKRObject*> s_Live;
   return s_Live;
 }
+inline bool IsAlive(const IKRObject* object) {
+  return KRLiveGraphObjects().count(object) != 0;
+}
 
-// A node with a stored name, and a class derived from it.
 class CKRTestPlace : public CKRGraphNode {
   KR_DECLARE_SERIAL_TYPE(CKRTestPlace, CKRSerialObjectTypeImpl, "{6C000000-0000-4000-8000-000000000001}")
 public:
@@ -35,7 +33,7 @@ class CKRTestTown : public CKRTestPlace {
   KR_DECLARE_SERIAL_TYPE(CKRTestTown, CKRSerialObjectTypeImpl, "{6C000000-0000-4000-8000-000000000002}")
 };
 
-// An edge that can be told to refuse its release.
+// Followed both ways; can be told to refuse its release.
 class CKRTestRoad : public CKRGraphEdge {
   KR_DECLARE_SERIAL_TYPE(CKRTestRoad, CKRSerialObjectTypeImpl, "{6C000000-0000-4000-8000-000000000003}")
 public:
@@ -45,30 +43,26 @@ public:
 protected:
   CKRTestRoad() { KRLiveGraphObjects().insert(this); }
   ~CKRTestRoad() override { KRLiveGraphObjects().erase(this); }
+  int Directed(std::uint16_t direction) { return CKRGraphEdge::OnInitialize() != 0 && SetDirection(direction) ? 1 : 0; }
 };
 
-// Roads followed only from the primary to the secondary node, and only
-// from the secondary to the primary node: the direction comes with the
-// class, so loaded edges have it too.
+// Only from the primary to the secondary node.
 class CKRTestOneWay : public CKRTestRoad {
   KR_DECLARE_SERIAL_TYPE(CKRTestOneWay, CKRSerialObjectTypeImpl, "{6C000000-0000-4000-8000-000000000004}")
 public:
-  int OnInitialize() override {
-    return CKRTestRoad::OnInitialize() != 0 && SetDirection(KR_EDGE_PRIMARY_TO_SECONDARY) ? 1 : 0;
-  }
+  int OnInitialize() override { return Directed(KR_EDGE_PRIMARY_TO_SECONDARY); }
 };
 
+// Only from the secondary to the primary node.
 class CKRTestBackWay : public CKRTestRoad {
   KR_DECLARE_SERIAL_TYPE(CKRTestBackWay, CKRSerialObjectTypeImpl, "{6C000000-0000-4000-8000-000000000005}")
 public:
-  int OnInitialize() override {
-    return CKRTestRoad::OnInitialize() != 0 && SetDirection(KR_EDGE_SECONDARY_TO_PRIMARY) ? 1 : 0;
-  }
+  int OnInitialize() override { return Directed(KR_EDGE_SECONDARY_TO_PRIMARY); }
 };
 
-// A depth-first visitor whose VisitNode override logs "+name" before and
-// "-name" after the base's step, unless told to be quiet, and runs a hook
-// first; a hook that returns false skips the node.
+// Logs "+name" before and "-name" after the base's step (unless quiet),
+// counts its calls, and runs a hook first; a hook answering false skips
+// the node.
 class CKRTestTracingVisitor : public CKRDFSVisitor {
   KR_DECLARE_OBJECT_TYPE(CKRTestTracingVisitor, CKRObjectTypeImpl, "{6C000000-0000-4000-8000-000000000006}")
 public:
@@ -80,16 +74,16 @@ public:
   int VisitNode(CKRGraphNode* node) override;
 };
 
-// Made through their types.
-CKRTestPlace* NewPlace(const wchar_t* name);
-CKRTestTown* NewTown(const wchar_t* name);
-CKRTestRoad* NewRoad(CKRGraphNode* primary, CKRGraphNode* secondary, CKRGuid typeID = CKRTestRoad::TypeID);
-// A new object of `type` as a T (a visitor, say).
+// A new object of `type` as a T.
 template <class T>
 T* NewObject(IKRObjectType* type) {
   return dynamic_cast<T*>(type->CreateInstance(CKRGuid()));
 }
-// The name of a test place, "?" for other nodes.
+CKRTestPlace* NewPlace(const wchar_t* name, bool town = false);
+// A road of the class `typeID`, joined and connected when it can be.
+CKRTestRoad* NewRoad(CKRGraphNode* primary, CKRGraphNode* secondary, CKRGuid typeID = CKRTestRoad::TypeID);
+// The name of a test place; "?" for null and other nodes.
 std::string PlaceName(CKRGraphNode* node);
-// The names of the visitor's collected nodes, in order.
+std::vector<CKRGraphEdge*> Edges(CKRGraphNode* node);
+// The names of the collected nodes, in order.
 std::vector<std::string> Collected(CKRDFSVisitor* visitor);
