@@ -23,7 +23,8 @@
 // part that was read stay in the archive).
 //
 // Open and Close pair up (each Open starts the XML library, its Close ends
-// it); an archive that is open refuses a second Open. The XML library is
+// it); an archive that is open refuses a second Open, also after an Open
+// that reported false, until it is closed. The XML library is
 // an implementation detail: nothing of it appears in this header. Used by
 // one thread at a time.
 #pragma once
