@@ -42,13 +42,12 @@ constexpr const wchar_t* kNotWritten = L"Archive File Not Written";
 const XMLCh kLS[] = {u'L', u'S', 0};
 const XMLCh kRootName[] = {u'K', u'R', u'X', u'M', u'L', 0};
 
-// Stands in for a document type declaration: the store's files never have
-// one, and a declaration is what brings entity expansion, external
-// subsets and content models into a hostile file.
-struct SKRDoctypeRefused {};
-
-// A parser that refuses documents with a document type declaration (see
-// above) and counts fatal errors.
+// A parser that refuses documents with a document type declaration (the
+// store's files never have one, and a declaration is what brings entity
+// expansion, external subsets and content models into a hostile file) and
+// counts fatal errors. The refusal is noted and the file then fails as a
+// whole: aborting the scanner from inside the declaration would leak what
+// it holds at that moment.
 class CKRArchiveParser : public XercesDOMParser, private ErrorHandler, private XMLEntityResolver {
 public:
   CKRArchiveParser() {
@@ -68,7 +67,8 @@ public:
     setCreateCommentNodes(false);
     setErrorHandler(this);
   }
-  bool Failed() const { return m_FatalErrors > 0; }
+  bool Failed() const { return m_FatalErrors > 0 || m_HasDoctype; }
+  bool HasDoctype() const { return m_HasDoctype; }
 
   // Every element name passes through the tree's name table; it grows
   // with the tree (see KRNoteNewName).
@@ -79,8 +79,10 @@ public:
     XercesDOMParser::startElement(declaration, urlId, prefix, attributes, count, isEmpty, isRoot);
   }
 
-  void doctypeDecl(const DTDElementDecl&, const XMLCh* const, const XMLCh* const, const bool, const bool) override {
-    throw SKRDoctypeRefused();
+  void doctypeDecl(const DTDElementDecl& root, const XMLCh* const publicID, const XMLCh* const systemID,
+                   const bool internalSubset, const bool externalSubset) override {
+    m_HasDoctype = true;
+    XercesDOMParser::doctypeDecl(root, publicID, systemID, internalSubset, externalSubset);
   }
 
 private:
@@ -96,6 +98,7 @@ private:
 
   SecurityManager m_Security;
   int m_FatalErrors = 0;
+  bool m_HasDoctype = false;
   std::size_t m_Names = 0;
 };
 
@@ -326,6 +329,9 @@ int CKRXMLFileArchive::LoadDOMFromFile() {
       failed = true;
     }
     failed = failed || parser->Failed();
+    // A refused declaration: nothing of the file is used.
+    if (parser->HasDoctype())
+      return 0;
     tree->m_pDocument = parser->adoptDocument();
     tree->m_pParser = std::move(parser);
   } catch (...) {
