@@ -26,3 +26,4 @@ void KRDemoGeometry();
 void KRDemoFiles();
 void KRDemoThreads();
 void KRDemoPlugins();
+void KRDemoStorage();

@@ -12,6 +12,8 @@ int main() {
   KRDemoFramework();
   PrintSection(L"Models, views and tools");
   KRDemoTools();
+  PrintSection(L"XML storage: a graph and preferences in one file");
+  KRDemoStorage();
   PrintSection(L"Units and engineering values");
   KRDemoUnits();
   PrintSection(L"Math in two precisions");

@@ -45,6 +45,13 @@
 #include <krCoreLib/serialization/IKRSerializableAdaptor.h>
 #include <krCoreLib/serialization/KRFieldTypes.h>
 
+// Storage back-ends.
+#include <krCoreLib/storage/xml/CKRXMLFileArchive.h>
+#include <krCoreLib/storage/xml/CKRXMLFileDocument.h>
+#include <krCoreLib/storage/xml/CKRXMLFileFieldStream.h>
+#include <krCoreLib/storage/xml/CKRXMLFileTypeManifest.h>
+#include <krCoreLib/platform/KRFileChooser.h>
+
 // Application framework.
 #include <krCoreLib/framework/CKRGraphNode.h>
 #include <krCoreLib/framework/CKRGraphNodeVisitor.h>

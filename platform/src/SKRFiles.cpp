@@ -1,7 +1,9 @@
 #include "SKRFiles.h"
 
+#include <atomic>
 #include <cerrno>
 #include <climits>
+#include <cstdio>
 #include <cstring>
 #include <dirent.h>
 #include <fcntl.h>
@@ -342,4 +344,77 @@ std::FILE* SKRFiles::OpenStream(const char* path, const char* mode) noexcept {
   if (stream == nullptr)
     ::close(fd);
   return stream;
+}
+
+bool SKRReplacementFile::Begin(const char* path) noexcept {
+  Abandon();
+  m_Failed = false;
+  struct stat target {};
+  const bool exists = ::stat(path, &target) == 0;
+  if (exists && !S_ISREG(target.st_mode))
+    return false;
+  try {
+    m_Target = path;
+    // Names unique to this process and call; O_EXCL refuses anything that
+    // is already there (a stale file, a planted link).
+    static std::atomic<unsigned> s_Counter{0};
+    for (int attempt = 0; attempt < 16 && m_Fd < 0; ++attempt) {
+      char suffix[64];
+      std::snprintf(suffix, sizeof suffix, ".%ld.%u.tmp", long(::getpid()), s_Counter.fetch_add(1));
+      m_Temporary = m_Target + suffix;
+      m_Fd = Retry([&] { return ::open(m_Temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC | O_NOCTTY, 0666); });
+      if (m_Fd < 0 && errno != EEXIST)
+        break;
+    }
+  } catch (...) {
+    return false;
+  }
+  if (m_Fd < 0)
+    return false;
+  if (exists)
+    (void)::fchmod(m_Fd, target.st_mode & 07777);
+  return true;
+}
+
+bool SKRReplacementFile::Write(const void* data, std::size_t size) noexcept {
+  if (m_Fd < 0 || m_Failed)
+    return false;
+  if (!WriteFully(m_Fd, static_cast<const unsigned char*>(data), size))
+    m_Failed = true;
+  return !m_Failed;
+}
+
+bool SKRReplacementFile::Commit() noexcept {
+  if (m_Fd < 0)
+    return false;
+  bool ok = !m_Failed && Retry([&] { return ::fsync(m_Fd); }) == 0;
+  ok = CloseChecked(m_Fd) && ok;
+  m_Fd = -1;
+  ok = ok && ::rename(m_Temporary.c_str(), m_Target.c_str()) == 0;
+  if (!ok) {
+    ::unlink(m_Temporary.c_str());
+    m_Temporary.clear();
+    return false;
+  }
+  m_Temporary.clear();
+  // The rename itself reaches the disk with the folder's entry.
+  const std::size_t slash = m_Target.rfind('/');
+  const std::string folder = slash == std::string::npos ? "." : (slash == 0 ? "/" : m_Target.substr(0, slash));
+  const int folderFd = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (folderFd >= 0) {
+    (void)Retry([&] { return ::fsync(folderFd); });
+    ::close(folderFd);
+  }
+  return true;
+}
+
+void SKRReplacementFile::Abandon() noexcept {
+  if (m_Fd >= 0) {
+    ::close(m_Fd);
+    m_Fd = -1;
+  }
+  if (!m_Temporary.empty()) {
+    ::unlink(m_Temporary.c_str());
+    m_Temporary.clear();
+  }
 }

@@ -64,3 +64,37 @@ struct SKRFiles {
   // for a mode it does not know.
   static std::FILE* OpenStream(const char* path, const char* mode) noexcept;
 };
+
+// A file that replaces another one whole or not at all: written under a
+// temporary name in the target's folder, then flushed to the disk and
+// renamed over the target, so that a failed or interrupted save never
+// leaves the target half-written or truncated (the old file stays as it
+// was). A new file gets the permissions 0666 less the umask, a replaced one
+// keeps its own. Destroying the object before Commit removes the temporary
+// file. One object per save; not thread-safe.
+class SKRReplacementFile {
+public:
+  SKRReplacementFile() = default;
+  ~SKRReplacementFile() { Abandon(); }
+  SKRReplacementFile(const SKRReplacementFile&) = delete;
+  SKRReplacementFile& operator=(const SKRReplacementFile&) = delete;
+
+  // Creates the temporary file beside `path`. False when the target exists
+  // and is not a regular file (a directory, a device), or the folder does
+  // not take a new file.
+  bool Begin(const char* path) noexcept;
+  // Appends bytes; a failure is remembered and makes Commit fail.
+  bool Write(const void* data, std::size_t size) noexcept;
+  // Syncs and closes the temporary file, renames it over the target and
+  // syncs the folder. False, with the target untouched and the temporary
+  // file removed, when any write or step failed.
+  bool Commit() noexcept;
+  // Removes the temporary file (nothing when none is open).
+  void Abandon() noexcept;
+
+private:
+  int m_Fd = -1;
+  bool m_Failed = false;
+  std::string m_Target;
+  std::string m_Temporary;
+};

@@ -1,0 +1,354 @@
+#include <krCoreLib/storage/xml/CKRXMLFileArchive.h>
+
+#include <krCoreLib/platform/KRFileChooser.h>
+#include <krCoreLib/storage/xml/CKRXMLFileDocument.h>
+
+#include "KRXMLFileTree.h"
+#include "SKRFiles.h"
+
+#include <xercesc/dom/DOMError.hpp>
+#include <xercesc/dom/DOMErrorHandler.hpp>
+#include <xercesc/dom/DOMImplementation.hpp>
+#include <xercesc/dom/DOMImplementationLS.hpp>
+#include <xercesc/dom/DOMImplementationRegistry.hpp>
+#include <xercesc/dom/DOMLSOutput.hpp>
+#include <xercesc/dom/DOMLSSerializer.hpp>
+#include <xercesc/framework/MemBufInputSource.hpp>
+#include <xercesc/framework/XMLFormatter.hpp>
+#include <xercesc/sax/ErrorHandler.hpp>
+#include <xercesc/sax/SAXParseException.hpp>
+#include <xercesc/util/OutOfMemoryException.hpp>
+#include <xercesc/util/PlatformUtils.hpp>
+#include <xercesc/util/SecurityManager.hpp>
+#include <xercesc/util/XMLEntityResolver.hpp>
+#include <xercesc/util/XMLException.hpp>
+#include <xercesc/util/XMLUni.hpp>
+
+#include <cstring>
+#include <new>
+#include <string>
+#include <vector>
+
+XERCES_CPP_NAMESPACE_USE
+
+KR_IMPLEMENT_OBJECT_TYPE(CKRXMLFileArchive, CKRArchive)
+
+namespace {
+
+// The file dialog texts.
+constexpr const wchar_t* kFilter = L"All Files (*.*)|*.*||";
+constexpr const wchar_t* kNotWritten = L"Archive File Not Written";
+
+const XMLCh kLS[] = {u'L', u'S', 0};
+const XMLCh kRootName[] = {u'K', u'R', u'X', u'M', u'L', 0};
+
+// A parser that refuses documents with a document type declaration (the
+// store's files never have one, and a declaration is what brings entity
+// expansion, external subsets and content models into a hostile file) and
+// counts fatal errors. The refusal is noted and the file then fails as a
+// whole: aborting the scanner from inside the declaration would leak what
+// it holds at that moment.
+class CKRArchiveParser : public XercesDOMParser, private ErrorHandler, private XMLEntityResolver {
+public:
+  CKRArchiveParser() {
+    setValidationScheme(Val_Auto);
+    setDoNamespaces(false);
+    setDoSchema(false);
+    setValidationSchemaFullChecking(false);
+    // Defence in depth should a declaration ever get through: external
+    // entities read as empty text (never fetched), the expansion of
+    // entities is bounded (the XML library's own default limit), and the
+    // expansion appears as plain text.
+    setLoadExternalDTD(false);
+    setDisableDefaultEntityResolution(true);
+    setXMLEntityResolver(this);
+    setSecurityManager(&m_Security);
+    setCreateEntityReferenceNodes(false);
+    setCreateCommentNodes(false);
+    setErrorHandler(this);
+  }
+  bool Failed() const { return m_FatalErrors > 0 || m_HasDoctype; }
+  bool HasDoctype() const { return m_HasDoctype; }
+
+  // Every element name passes through the tree's name table; it grows
+  // with the tree (see KRNoteNewName).
+  void startElement(const XMLElementDecl& declaration, const unsigned int urlId, const XMLCh* const prefix,
+                    const RefVectorOf<XMLAttr>& attributes, const XMLSize_t count, const bool isEmpty,
+                    const bool isRoot) override {
+    KRNoteNewName(getDocument(), m_Names);
+    XercesDOMParser::startElement(declaration, urlId, prefix, attributes, count, isEmpty, isRoot);
+  }
+
+  void doctypeDecl(const DTDElementDecl& root, const XMLCh* const publicID, const XMLCh* const systemID,
+                   const bool internalSubset, const bool externalSubset) override {
+    m_HasDoctype = true;
+    XercesDOMParser::doctypeDecl(root, publicID, systemID, internalSubset, externalSubset);
+  }
+
+private:
+  void warning(const SAXParseException&) override {}
+  // Validity errors (only with a grammar, which is refused) do not make
+  // the file unreadable.
+  void error(const SAXParseException&) override {}
+  void fatalError(const SAXParseException&) override { ++m_FatalErrors; }
+  void resetErrors() override { m_FatalErrors = 0; }
+  InputSource* resolveEntity(XMLResourceIdentifier*) override {
+    return new MemBufInputSource(reinterpret_cast<const XMLByte*>(""), 0, "", false);
+  }
+
+  SecurityManager m_Security;
+  int m_FatalErrors = 0;
+  bool m_HasDoctype = false;
+  std::size_t m_Names = 0;
+};
+
+// The writer's error handler: the writer always continues, and an error
+// makes the save fail (the file would not read back as written).
+class CKRWriteErrors : public DOMErrorHandler {
+public:
+  bool handleError(const DOMError& error) override {
+    if (error.getSeverity() != DOMError::DOM_SEVERITY_WARNING)
+      m_Failed = true;
+    return true;
+  }
+  bool m_Failed = false;
+};
+
+// The writer's output: the replacement file, through a buffer of 64 KiB
+// (a few large writes instead of many small ones).
+class CKRReplacementTarget : public XMLFormatTarget {
+public:
+  explicit CKRReplacementTarget(SKRReplacementFile& file) : m_File(file) { m_Buffer.reserve(kBufferSize); }
+  void writeChars(const XMLByte* const bytes, const XMLSize_t count, XMLFormatter* const) override {
+    if (m_Buffer.size() + count > kBufferSize)
+      flush();
+    if (count >= kBufferSize)
+      m_File.Write(bytes, count);
+    else
+      m_Buffer.insert(m_Buffer.end(), bytes, bytes + count);
+  }
+  void flush() override {
+    if (!m_Buffer.empty())
+      m_File.Write(m_Buffer.data(), m_Buffer.size());
+    m_Buffer.clear();
+  }
+
+private:
+  static constexpr std::size_t kBufferSize = 64 * 1024;
+  SKRReplacementFile& m_File;
+  std::vector<XMLByte> m_Buffer;
+};
+
+// The file name as the file system's path: UTF-8, not empty, free of NULs.
+bool NativePath(const CKRString& name, std::string& path) {
+  if (name.IsEmpty() || name.str().find(L'\0') != std::wstring::npos)
+    return false;
+  path = name.ToUtf8();
+  return true;
+}
+
+DOMImplementation* LSImplementation() {
+  return DOMImplementationRegistry::getDOMImplementation(kLS);
+}
+
+}  // namespace
+
+SKRXMLFileTree::~SKRXMLFileTree() {
+  if (m_pDocument != nullptr)
+    m_pDocument->release();
+}
+
+CKRXMLFileArchive::~CKRXMLFileArchive() {
+  ReleaseTree();
+  EndLibraryUse();
+}
+
+int CKRXMLFileArchive::OnInitialize() {
+  if (CKRArchive::OnInitialize() == 0)
+    return 0;
+  m_pTree = nullptr;
+  m_LibraryStarted = false;
+  return 1;
+}
+
+int CKRXMLFileArchive::SetFile(const CKRString& name) {
+  m_FileName = name;
+  return 1;
+}
+
+CKRBOOL CKRXMLFileArchive::Open(AccessMode mode) {
+  if (m_LibraryStarted || m_pTree != nullptr)
+    return false;
+  CKRArchive::Open(mode);
+  try {
+    XMLPlatformUtils::Initialize();
+    m_LibraryStarted = true;
+  } catch (...) {
+    return false;
+  }
+  switch (mode) {
+    case AccessRead:
+      return LoadDOMFromFile() != 0;
+    case AccessWrite:
+      return CreateDOM() != 0;
+    default:
+      return false;
+  }
+}
+
+CKRBOOL CKRXMLFileArchive::OpenWithUI(AccessMode mode) {
+  if (m_FileName.IsEmpty()) {
+    SKRFileChooserRequest request;
+    request.m_ForSaving = false;
+    request.m_Title = L"Open Archive";
+    request.m_Filter = kFilter;
+    std::wstring path;
+    if (!SKRFileChooser::Choose(request, path))
+      return false;
+    m_FileName = CKRString(std::move(path));
+  }
+  return Open(mode);
+}
+
+CKRBOOL CKRXMLFileArchive::Close() {
+  bool written = true;
+  if (m_pTree != nullptr && GetAccessMode() == AccessWrite)
+    written = WriteDOMToFile() != 0;
+  const CKRBOOL closed = CKRArchive::Close();
+  ReleaseTree();
+  EndLibraryUse();
+  if (!written)
+    return CKRBOOL(false, kNotWritten);
+  return closed;
+}
+
+CKRBOOL CKRXMLFileArchive::CloseWithUI() {
+  if (m_FileName.IsEmpty()) {
+    SKRFileChooserRequest request;
+    request.m_ForSaving = true;
+    request.m_Title = L"Save Archive";
+    request.m_Filter = kFilter;
+    std::wstring path;
+    if (!SKRFileChooser::Choose(request, path))
+      return false;
+    m_FileName = CKRString(std::move(path));
+  }
+  return Close();
+}
+
+CKRDocument* CKRXMLFileArchive::CreateNewDocument(CKRGuid documentID, IKRObjectType*) {
+  if (m_pTree == nullptr || m_pTree->m_pDocument == nullptr)
+    return nullptr;
+  CKRDocument* document = CKRArchive::CreateNewDocument(documentID, CKRXMLFileDocument::GetCKRXMLFileDocumentType());
+  if (auto* xml = dynamic_cast<CKRXMLFileDocument*>(document))
+    xml->SetArchive(this);
+  return document;
+}
+
+void CKRXMLFileArchive::ReleaseTree() {
+  delete m_pTree;
+  m_pTree = nullptr;
+}
+
+void CKRXMLFileArchive::EndLibraryUse() {
+  if (!m_LibraryStarted)
+    return;
+  m_LibraryStarted = false;
+  XMLPlatformUtils::Terminate();
+}
+
+int CKRXMLFileArchive::CreateDOM() {
+  DOMImplementation* implementation = LSImplementation();
+  if (implementation == nullptr)
+    return 0;
+  try {
+    auto tree = std::make_unique<SKRXMLFileTree>();
+    tree->m_pDocument = implementation->createDocument(nullptr, kRootName, nullptr);
+    if (tree->m_pDocument == nullptr)
+      return 0;
+    ReleaseTree();
+    m_pTree = tree.release();
+    return 1;
+  } catch (...) {
+    return 0;
+  }
+}
+
+int CKRXMLFileArchive::WriteDOMToFile() {
+  if (m_pTree == nullptr || m_pTree->m_pDocument == nullptr)
+    return 0;
+  std::string path;
+  if (!NativePath(m_FileName, path))
+    return 0;
+  DOMImplementation* implementation = LSImplementation();
+  if (implementation == nullptr)
+    return 0;
+  SKRReplacementFile file;
+  if (!file.Begin(path.c_str()))
+    return 0;
+  bool written = false;
+  try {
+    DOMLSSerializer* serializer = static_cast<DOMImplementationLS*>(implementation)->createLSSerializer();
+    DOMLSOutput* output = static_cast<DOMImplementationLS*>(implementation)->createLSOutput();
+    CKRWriteErrors errors;
+    CKRReplacementTarget target(file);
+    DOMConfiguration* configuration = serializer->getDomConfig();
+    configuration->setParameter(XMLUni::fgDOMErrorHandler, static_cast<DOMErrorHandler*>(&errors));
+    if (configuration->canSetParameter(XMLUni::fgDOMWRTFormatPrettyPrint, true))
+      configuration->setParameter(XMLUni::fgDOMWRTFormatPrettyPrint, true);
+    output->setByteStream(&target);
+    // The writer's own result is consulted too: a failure it reports is a
+    // file that does not hold the tree.
+    written = serializer->write(m_pTree->m_pDocument, output) && !errors.m_Failed;
+    target.flush();
+    output->release();
+    serializer->release();
+  } catch (...) {
+    written = false;
+  }
+  return written && file.Commit() ? 1 : 0;
+}
+
+int CKRXMLFileArchive::LoadDOMFromFile() {
+  ReleaseTree();
+  std::string path;
+  unsigned char* data = nullptr;
+  std::size_t size = 0;
+  // Only a regular file is read (a directory, a pipe or a device is not).
+  if (!NativePath(m_FileName, path) || !SKRFiles::ReadWholeFile(path.c_str(), kMaxFileSize, data, size))
+    return 0;
+  std::unique_ptr<unsigned char[]> bytes(data);
+  bool failed = false;
+  auto tree = std::make_unique<SKRXMLFileTree>();
+  try {
+    auto parser = std::make_unique<CKRArchiveParser>();
+    MemBufInputSource source(bytes.get(), size, "archive", false);
+    try {
+      parser->parse(source);
+    } catch (...) {
+      failed = true;
+    }
+    failed = failed || parser->Failed();
+    // A refused declaration: nothing of the file is used.
+    if (parser->HasDoctype())
+      return 0;
+    tree->m_pDocument = parser->adoptDocument();
+    tree->m_pParser = std::move(parser);
+  } catch (...) {
+    return 0;
+  }
+  // Nothing usable was read: no root element.
+  DOMElement* root = tree->m_pDocument != nullptr ? tree->m_pDocument->getDocumentElement() : nullptr;
+  if (root == nullptr)
+    return 0;
+  m_pTree = tree.release();
+  try {
+    KRForEachGuidChild(root, [&](const CKRGuid& id, DOMElement* element) {
+      if (auto* document = dynamic_cast<CKRXMLFileDocument*>(CreateNewDocument(id, nullptr)))
+        document->LoadTypeManifests(KRFromDOM(element));
+    });
+  } catch (...) {
+    failed = true;
+  }
+  return failed ? 0 : 1;
+}
