@@ -94,6 +94,9 @@ public:
   int ReadLinks(IKRFieldData* fieldData, IKRCollection* collection) override;
   int WriteLink(IKRFieldData* fieldData, IKRObject* object) override;
   int WriteLinks(IKRFieldData* fieldData, IKRIterator* iterator) override;
+  // The stored object this stream reads and writes (elements of the medium
+  // do not move); found by instance ID on first use when not given.
+  void SetStoredObject(SKRStoredObject* stored) { m_pStored = stored; }
 
 protected:
   CKRMemoryFieldStream() = default;
