@@ -110,6 +110,8 @@ int CKRMemoryFieldStream::WriteObjectHeader(IKRObject* object) {
     return 0;
   ++stored->m_HeaderWrites;
   stored->m_TypeID = object->GetType()->GetID();
+  if (SKRStoredDocument* document = m_pMemoryDocument != nullptr ? m_pMemoryDocument->Stored() : nullptr)
+    document->m_HeaderOrder.push_back(GetStoredInstanceID());
   return 1;
 }
 

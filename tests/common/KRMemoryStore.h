@@ -27,6 +27,7 @@ struct SKRStoredObject {
 struct SKRStoredDocument {
   std::map<CKRGuid, int> m_TypeHeaders;                    // type ID -> header writes
   std::unordered_map<CKRGuid, SKRStoredObject> m_Objects;  // by instance ID
+  std::vector<CKRGuid> m_HeaderOrder;                      // instance IDs as their headers were written
 };
 
 struct SKRStoredMedium {
