@@ -34,10 +34,13 @@ CKRObjGuidPtrMap<CKRTypeManifest>::Iterator CKRDocument::GetTypeManifestIterator
 }
 
 IKRObject* CKRDocument::GetObject(CKRGuid instanceID, CKRGuid typeID) {
-  // A type the type system does not know makes nothing, not even a
-  // manifest or stream for it.
+  // A type the type system does not know, or not the class the link
+  // requires, makes nothing, not even a manifest or stream for it. The
+  // requirement is used up here: the fields of the object name their own.
+  const CKRGuid required = m_RequiredLinkType;
+  m_RequiredLinkType = CKRGuid();
   IKRObjectType* type = CKRTypeSystem::FindType(typeID);
-  if (type == nullptr)
+  if (type == nullptr || (required.IsValid() && type->IsTypeOf(required) == 0))
     return nullptr;
   CKRTypeManifest* manifest = FindTypeManifest(typeID);
   if (manifest == nullptr) {
@@ -83,6 +86,12 @@ IKRObject* CKRDocument::GetObject(CKRGuid instanceID, CKRGuid typeID) {
   if (m_LoadNesting == 0)
     LoadPending();
   return object;
+}
+
+CKRGuid CKRDocument::RequireLinkType(CKRGuid typeID) {
+  const CKRGuid previous = m_RequiredLinkType;
+  m_RequiredLinkType = typeID;
+  return previous;
 }
 
 void CKRDocument::LoadPending() {

@@ -4,6 +4,7 @@
 
 #include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
 
+#include <utility>
 #include <vector>
 
 // 1 when no child has `id`; otherwise the child's Release result. A child
@@ -21,17 +22,15 @@ int KRReleaseChild(CKRObjGuidPtrMap<T>& children, CKRGuid id) {
 }
 
 // Releases every child in ascending ID order: 1, or 0 when a child refused
-// (it stays). The children are taken out in one pass first, so that each
-// release costs no look-up.
+// (it stays). The children are taken out in one pass over the map's table
+// first, so that each release costs no look-up.
 template <class T>
 int KRReleaseChildren(CKRObjGuidPtrMap<T>& children) {
-  std::vector<T*> taken;
-  taken.reserve(std::size_t(children.GetCount()));
-  for (const auto& [id, child] : children)
-    taken.push_back(child);
+  std::vector<std::pair<CKRGuid, T*>> taken;
+  children.GetEntries(taken);
   children.RemoveAll(false);
   int result = 1;
-  for (T* child : taken)
+  for (const auto& [id, child] : taken)
     if (child->Release() == 0) {
       children.Add(child);
       result = 0;

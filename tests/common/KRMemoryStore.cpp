@@ -24,22 +24,33 @@ CKRBOOL CKRMemoryArchive::Open(AccessMode mode) {
   CKRArchive::Open(mode);
   if ((mode & AccessRead) == 0 || m_pMedium == nullptr)
     return true;
-  for (const auto& [documentID, stored] : m_pMedium->m_Documents) {
+  for (auto& [documentID, stored] : m_pMedium->m_Documents) {
     CKRDocument* document = CreateNewDocument(documentID, nullptr);
     if (document == nullptr)
       return false;
-    // Manifests by type, streams in ascending ID order within each.
-    std::map<CKRGuid, std::vector<CKRGuid>> byType;
-    for (const auto& [instanceID, object] : stored.m_Objects)
-      byType[object.m_TypeID].push_back(instanceID);
-    for (auto& [typeID, instances] : byType) {
-      std::sort(instances.begin(), instances.end());
-      CKRTypeManifest* manifest = document->CreateTypeManifest(typeID, nullptr);
-      if (manifest == nullptr)
-        return false;
-      manifest->ReadTypeHeader(CKRTypeSystem::FindType(typeID));
-      for (const CKRGuid& instanceID : instances)
-        manifest->CreateFieldStream(instanceID, nullptr);
+    // Manifests by type, streams in ascending ID order within each; each
+    // stream is handed its stored object, so reading needs no look-up.
+    struct SKRInstance {
+      CKRGuid m_TypeID;
+      CKRGuid m_InstanceID;
+      SKRStoredObject* m_pObject;
+    };
+    std::vector<SKRInstance> instances;
+    instances.reserve(stored.m_Objects.size());
+    for (auto& [instanceID, object] : stored.m_Objects)
+      instances.push_back({object.m_TypeID, instanceID, &object});
+    std::sort(instances.begin(), instances.end(), [](const SKRInstance& a, const SKRInstance& b) {
+      return a.m_TypeID != b.m_TypeID ? a.m_TypeID < b.m_TypeID : a.m_InstanceID < b.m_InstanceID;
+    });
+    CKRTypeManifest* manifest = nullptr;
+    for (const SKRInstance& instance : instances) {
+      if (manifest == nullptr || manifest->GetStoredTypeID() != instance.m_TypeID) {
+        if ((manifest = document->CreateTypeManifest(instance.m_TypeID, nullptr)) == nullptr)
+          return false;
+        manifest->ReadTypeHeader(CKRTypeSystem::FindType(instance.m_TypeID));
+      }
+      if (auto* stream = dynamic_cast<CKRMemoryFieldStream*>(manifest->CreateFieldStream(instance.m_InstanceID, nullptr)))
+        stream->SetStoredObject(instance.m_pObject);
     }
   }
   return true;
@@ -99,6 +110,8 @@ int CKRMemoryFieldStream::WriteObjectHeader(IKRObject* object) {
     return 0;
   ++stored->m_HeaderWrites;
   stored->m_TypeID = object->GetType()->GetID();
+  if (SKRStoredDocument* document = m_pMemoryDocument != nullptr ? m_pMemoryDocument->Stored() : nullptr)
+    document->m_HeaderOrder.push_back(GetStoredInstanceID());
   return 1;
 }
 

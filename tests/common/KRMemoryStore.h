@@ -27,6 +27,7 @@ struct SKRStoredObject {
 struct SKRStoredDocument {
   std::map<CKRGuid, int> m_TypeHeaders;                    // type ID -> header writes
   std::unordered_map<CKRGuid, SKRStoredObject> m_Objects;  // by instance ID
+  std::vector<CKRGuid> m_HeaderOrder;                      // instance IDs as their headers were written
 };
 
 struct SKRStoredMedium {
@@ -94,6 +95,9 @@ public:
   int ReadLinks(IKRFieldData* fieldData, IKRCollection* collection) override;
   int WriteLink(IKRFieldData* fieldData, IKRObject* object) override;
   int WriteLinks(IKRFieldData* fieldData, IKRIterator* iterator) override;
+  // The stored object this stream reads and writes (elements of the medium
+  // do not move); found by instance ID on first use when not given.
+  void SetStoredObject(SKRStoredObject* stored) { m_pStored = stored; }
 
 protected:
   CKRMemoryFieldStream() = default;

@@ -1,6 +1,7 @@
 // Field data: values as text, comparison and copy across data types, the
 // flags that decide the property grid's questions, group field data and
 // action pseudo-fields.
+#include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/serialization/CKRFieldDataAction.h>
 #include <krCoreLib/serialization/CKRFieldT.h>
 #include <krCoreLib/serialization/CKRGroupFieldData.h>
@@ -90,6 +91,42 @@ TEST(CKRFieldDataT, EqualsAndSetToNeedTheSameDataType) {
   EXPECT_EQ(da->Equals(db), 1);
   for (IKRFieldData* d : {da, db, dg})
     d->Release(false);
+}
+
+// Links compare and copy the object they hold, only with a link field; a
+// deep release lets go of the linked object and clears the member, while a
+// collection's deep release empties it and leaves the elements alive.
+TEST(CKRObjFieldDataT, EqualsSetToAndDeepRelease) {
+  using namespace KRTestFields;
+  CKRTypeSystem::Initialize(CKRGuid::Literal("{5D000000-0000-4000-8000-000000000003}"));  // the records' fields
+  CKRTestRecord* a = NewRecord(L"a");
+  CKRTestRecord* b = NewRecord(L"b");
+  CKRTestRecord* target = NewRecord(L"target");
+  a->m_pNext = target;
+  IKRFieldData* linkA = a->GetFieldData(kNext);
+  IKRFieldData* linkB = b->GetFieldData(kNext);
+  EXPECT_EQ(linkA->Equals(linkB), 0);
+  EXPECT_EQ(linkA->Equals(a->GetFieldData(kName)), 0);
+  EXPECT_EQ(linkB->SetTo(a->GetFieldData(kName)), 0);
+  EXPECT_EQ(linkB->SetTo(linkA), 1);
+  EXPECT_EQ(b->m_pNext, target);
+  EXPECT_EQ(linkA->Equals(linkB), 1);
+
+  const int destroyed = CKRTestRecord::s_Destroyed;
+  CKRTestRecord* held = target;
+  linkA->GetField()->CreateFieldData(&held)->Release(true);
+  EXPECT_EQ(held, nullptr);
+  EXPECT_EQ(CKRTestRecord::s_Destroyed, destroyed + 1);
+
+  CKRObjPtrList<CKRTestRecord> list;
+  list.Add(a);
+  list.Add(b);
+  a->GetFieldData(kChildren)->GetField()->CreateFieldData(&list)->Release(true);
+  EXPECT_EQ(list.GetCount(), 0);
+  EXPECT_EQ(CKRTestRecord::s_Destroyed, destroyed + 1);
+  a->m_pNext = b->m_pNext = nullptr;
+  a->Release();
+  b->Release();
 }
 
 // The property grid's questions follow the flags, and ask the object where

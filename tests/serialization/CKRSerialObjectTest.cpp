@@ -13,6 +13,18 @@
 
 using namespace KRTestFields;
 
+// A storable class that only the naming test instantiates, so that its
+// counter starts at 1.
+class CKRTestCounted : public CKRSerialObject {
+  KR_DECLARE_SERIAL_TYPE(CKRTestCounted, CKRSerialObjectTypeImpl, "{5B000000-0000-4000-8000-000000000003}")
+};
+
+KR_IMPLEMENT_SERIAL_TYPE(CKRTestCounted, CKRSerialObject)
+
+void CKRTestCounted::CKRTestCountedType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
+  AppendParentFields(target, object);
+}
+
 namespace {
 
 constexpr CKRGuid kRepository = CKRGuid::Literal("{5D000000-0000-4000-8000-000000000001}");
@@ -62,6 +74,13 @@ TEST_F(CKRSerialObjectTest, FieldsAreInheritedOnceBaseFirst) {
 }
 
 TEST_F(CKRSerialObjectTest, InstancesAreNamedCountedAndNotTracked) {
+  // The counter starts at 1 and counts each instance made.
+  auto* countedType = CKRTestCounted::GetCKRTestCountedType();
+  EXPECT_EQ(countedType->GetNextInstanceName(), L"CKRTestCounted 1");
+  IKRObject* first = countedType->CreateInstance(CKRGuid());
+  EXPECT_EQ(countedType->GetNextInstanceName(), L"CKRTestCounted 2");
+  first->Release();
+
   auto* type = CKRTestRecord::GetCKRTestRecordType();
   const CKRString before = type->GetNextInstanceName();
   CKRTestRecord* record = NewRecord(L"r");

@@ -7,6 +7,7 @@
 using namespace KRTestFields;
 
 KR_IMPLEMENT_SERIAL_TYPE(CKRTestRecord, CKRSerialObject)
+KR_IMPLEMENT_SERIAL_TYPE(CKRTestIndex, CKRSerialObject)
 KR_IMPLEMENT_SERIAL_TYPE(CKRTestBase, CKRSerialObject)
 KR_IMPLEMENT_SERIAL_TYPE(CKRTestMiddle, CKRTestBase)
 KR_IMPLEMENT_SERIAL_TYPE(CKRTestLeaf, CKRTestMiddle)
@@ -29,6 +30,13 @@ void CKRTestRecord::CKRTestRecordType::CreateFields(CKRSerialObjectTypeImpl* tar
                                   kReadOnly, KRDT_STRING, KRF_READ);
   BindField<CKRFieldT<CKRString>>(target, object, &CKRTestRecord::m_WriteOnly, L"WriteOnly", L"Written, never read",
                                   kWriteOnly, KRDT_STRING, KRF_WRITE);
+}
+
+void CKRTestIndex::CKRTestIndexType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
+  AppendParentFields(target, object);
+  BindField<CKRObjCollectionFieldT<CKRObjGuidPtrMap<CKRTestRecord>>>(target, object, &CKRTestIndex::m_Members, L"Members",
+                                                                     L"Records by ID", kMembers,
+                                                                     KRDT_OBJECT_COLLECTION, kStored);
 }
 
 void CKRTestBase::CKRTestBaseType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {

@@ -1,6 +1,7 @@
 // Storable classes for the serialization tests.
 #pragma once
 
+#include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
 #include <krCoreLib/objectmodel/CKRObjPtrList.h>
 #include <krCoreLib/serialization/CKRSerialObject.h>
 
@@ -12,6 +13,7 @@ inline constexpr CKRGuid kNext = CKRGuid::Literal("{5A000000-0000-4000-8000-0000
 inline constexpr CKRGuid kChildren = CKRGuid::Literal("{5A000000-0000-4000-8000-000000000005}");
 inline constexpr CKRGuid kReadOnly = CKRGuid::Literal("{5A000000-0000-4000-8000-000000000006}");
 inline constexpr CKRGuid kWriteOnly = CKRGuid::Literal("{5A000000-0000-4000-8000-000000000007}");
+inline constexpr CKRGuid kMembers = CKRGuid::Literal("{5A000000-0000-4000-8000-000000000008}");
 inline constexpr CKRGuid kBase = CKRGuid::Literal("{5A000000-0000-4000-8000-0000000000B1}");
 inline constexpr CKRGuid kMiddle = CKRGuid::Literal("{5A000000-0000-4000-8000-0000000000B2}");
 inline constexpr CKRGuid kLeaf = CKRGuid::Literal("{5A000000-0000-4000-8000-0000000000B3}");
@@ -53,6 +55,13 @@ public:
 protected:
   CKRTestRecord() = default;
   ~CKRTestRecord() override { ++s_Destroyed; }
+};
+
+// A collection field over a map of records.
+class CKRTestIndex : public CKRSerialObject {
+  KR_DECLARE_SERIAL_TYPE(CKRTestIndex, CKRSerialObjectTypeImpl, "{5B000000-0000-4000-8000-000000000002}")
+public:
+  CKRObjGuidPtrMap<CKRTestRecord> m_Members;
 };
 
 // Three levels, one field each.

@@ -25,7 +25,7 @@ public:
       const SKRSlot& entry = m_Slots[slot];
       if (entry.m_pObject == nullptr)
         return nullptr;
-      if (entry.m_ID == id)
+      if (id == entry.m_ID)
         return entry.m_pObject;
     }
   }
@@ -50,7 +50,7 @@ public:
       const SKRSlot& entry = m_Slots[hole];
       if (entry.m_pObject == nullptr)
         return false;
-      if (entry.m_ID == id)
+      if (id == entry.m_ID)
         break;
     }
     if (m_Slots[hole].m_pObject != object)
@@ -58,7 +58,7 @@ public:
     // Close the gap: an entry further on moves into the hole unless its
     // home lies cyclically in (hole, next].
     for (std::size_t next = Next(hole); m_Slots[next].m_pObject != nullptr; next = Next(next)) {
-      const std::size_t home = Home(m_Slots[next].m_ID);
+      const std::size_t home = Home(CKRGuid(m_Slots[next].m_ID));
       const bool staysPut = hole <= next ? (hole < home && home <= next) : (hole < home || home <= next);
       if (!staysPut) {
         m_Slots[hole] = m_Slots[next];
@@ -77,12 +77,14 @@ public:
   void ForEach(TFunction&& function) const {
     for (const SKRSlot& entry : m_Slots)
       if (entry.m_pObject != nullptr)
-        function(entry.m_ID, entry.m_pObject);
+        function(CKRGuid(entry.m_ID), entry.m_pObject);
   }
 
 private:
+  // The plain GUID, not a CKRGuid (whose virtual destructor adds a pointer):
+  // 24 bytes a slot instead of 32, so a large table misses the cache less.
   struct SKRSlot {
-    CKRGuid m_ID;
+    GUID m_ID{};
     T* m_pObject = nullptr;  // null: empty
   };
 
@@ -99,7 +101,7 @@ private:
     std::size_t slot = Home(id);
     while (m_Slots[slot].m_pObject != nullptr)
       slot = Next(slot);
-    m_Slots[slot] = {id, object};
+    m_Slots[slot] = {id.GetGUID(), object};
   }
 
   void Grow() {
@@ -110,7 +112,7 @@ private:
       --m_Shift;
     for (const SKRSlot& entry : old)
       if (entry.m_pObject != nullptr)
-        Place(entry.m_ID, entry.m_pObject);
+        Place(CKRGuid(entry.m_ID), entry.m_pObject);
   }
 
   std::vector<SKRSlot> m_Slots;  // a power of two long

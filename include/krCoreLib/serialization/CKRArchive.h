@@ -38,8 +38,8 @@ public:
   virtual CKRDocument* CreateNewDocument(CKRGuid documentID, IKRObjectType* documentType);
   // True when absent; otherwise the document's Release result.
   virtual CKRBOOL DeleteDocument(CKRGuid documentID);
-  // Releases the documents in ascending ID order: false when an entry is
-  // null, otherwise true.
+  // Releases every document in ascending ID order: true, or false when one
+  // refused its release (it stays; the others are still released).
   virtual CKRBOOL DeleteAllDocuments();
 
   int GetAccessMode() const { return m_AccessMode; }

@@ -38,7 +38,16 @@ public:
   // storable, when its manifest or stream cannot be made, when the object
   // refuses OnInitialize, or when its header or fields cannot be read (the
   // half-built object is released).
+  // Also null, creating nothing, when a link type is required (see
+  // RequireLinkType) and the stored type is neither it nor derived from it.
   virtual IKRObject* GetObject(CKRGuid instanceID, CKRGuid typeID);
+  // Sets the class the next GetObject must yield (the stored type that type
+  // or derived from it) and returns the requirement it replaces, for the
+  // caller to restore. A link field names its member's class around its
+  // ReadLink, so that a stored object of another class is not created only
+  // to be refused. It holds for one GetObject, not for the objects that one
+  // links to; the null ID requires nothing.
+  CKRGuid RequireLinkType(CKRGuid typeID);
   // A new manifest for `typeID`, made by `manifestType` (a fresh instance
   // ID, then re-keyed to `typeID`); null when the type is null, not a
   // manifest type, abstract, or when the type has a manifest already.
@@ -80,6 +89,7 @@ private:
   void LoadPending();
 
   CKRGuid m_SerialSessionID;
+  CKRGuid m_RequiredLinkType;
   CKRObjGuidPtrMap<CKRTypeManifest> m_TypeManifests;
   int m_SaveNesting = 0;
   int m_LoadNesting = 0;

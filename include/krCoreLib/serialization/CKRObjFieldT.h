@@ -11,6 +11,7 @@
 
 #include <krCoreLib/objectmodel/IKRObject.h>
 #include <krCoreLib/serialization/CKRFieldAdaptor.h>
+#include <krCoreLib/serialization/CKRDocument.h>
 #include <krCoreLib/serialization/CKRFieldDataAdaptor.h>
 #include <krCoreLib/serialization/IKRFieldStream.h>
 #include <krCoreLib/serialization/IKRSerializable.h>
@@ -75,9 +76,22 @@ public:
     return 1;
   }
   // Takes the object the stream resolves: 1. No object, or one that is not
-  // a T, leaves the member and gives 0.
+  // a T, leaves the member and gives 0. A T with a type ID has the document
+  // require that class, so a link stored with another class creates no
+  // object (which nothing would hold).
   int SerializeFrom(IKRFieldStream* stream) override {
-    IKRObject* linked = stream != nullptr ? stream->ReadLink(this) : nullptr;
+    if (stream == nullptr)
+      return 0;
+    IKRObject* linked = nullptr;
+    if constexpr (requires { T::TypeID; }) {
+      CKRDocument* document = stream->GetDocument();
+      const CKRGuid previous = document != nullptr ? document->RequireLinkType(T::TypeID) : CKRGuid();
+      linked = stream->ReadLink(this);
+      if (document != nullptr)
+        document->RequireLinkType(previous);
+    } else {
+      linked = stream->ReadLink(this);
+    }
     T* typed = nullptr;
     if constexpr (std::is_same_v<T, IKRObject>)
       typed = linked;
