@@ -157,7 +157,7 @@ TYPED_TEST(CKRMatrixTTest, ProductsAreConsistent) {
 // M * Inverse(M) is the identity within a bound proportional to the
 // condition number; the adjoint is the inverse times the determinant; a
 // determinant not above EPSILON or not finite gives ZERO.
-TYPED_TEST(CKRMatrixTTest, InverseIsExactUpToTheConditionNumber) {
+TYPED_TEST(CKRMatrixTTest, InverseIsExactUpToTheAdjointErrorBound) {
   std::mt19937 random(KRTestSeed());
   TestFixture::ForEachSize([&](auto size) {
     using Matrix = decltype(size);
