@@ -243,6 +243,8 @@ bool Polygon::triangulation() {
   m_PieceQueue = std::vector<PieceVertex>();
   m_PieceBuffer = std::vector<PieceVertex>();
   m_Stack = std::vector<unsigned>();
+  if (!trianglesCoverContours())
+    return fail(kMessageOpenLoop);
   std::printf("Total number of triangles:%zu\n", m_Triangles.size());
   std::fflush(stdout);
   m_Stage = Stage::Triangulated;

@@ -228,7 +228,7 @@ bool Polygon::partition2Monotone() {
     return false;
   if (m_Stage != Stage::Finished)
     return true;
-  if (m_EventQueue.empty() || m_Points[m_EventQueue.front()].m_Type != START)
+  if (m_EventQueue.empty() || m_Points[m_EventQueue.front()].m_Type != START || !contoursAgreeWithNesting())
     return fail(kMessageOrientation);
 
   for (const unsigned id : m_EventQueue) {

@@ -200,38 +200,62 @@ TEST(Polygon, AddContourRefusesUnusableContours) {
 }
 
 TEST(Polygon, MalformedInputEndsInAReportOrAResult) {
+  // Every contour must run the way its nesting asks (outside counter-
+  // clockwise, holes clockwise, islands in holes counter-clockwise again)
+  // and be simple; a result must be counter-clockwise triangles covering
+  // exactly the contours' area.
+  const KRContour island = Contour({{1.5, 1.5}, {2.5, 1.5}, {2.5, 2.5}, {1.5, 2.5}});
+  const KRContour beside = Contour({{6, 0}, {7, 0}, {7, 1}, {6, 1}});
   const struct {
     const char* m_Name;
     std::vector<std::pair<KRContour, bool>> m_Contours;
-    int m_Outcome;  // 1 success, 0 failure, -1 either
+    bool m_bDone;
+    const char* m_Message;  // the diagnostic of a failure, if fixed
+    double m_Area;          // the triangles' area of a result
   } cases[] = {
-      {"clockwise boundary", {{Contour({{0, 0}, {0, 4}, {4, 4}, {4, 0}}), false}}, 0},
-      {"no contour", {}, 0},
-      {"hole turning the wrong way", {{kSquare, false}, {kHole, true}}, -1},
-      {"hole outside", {{kSquare, false}, {Contour({{6, 1}, {6, 3}, {8, 3}, {8, 1}}), false}}, -1},
-      {"collinear boundary", {{Contour({{0, 0}, {1, 1}, {2, 2}}), false}}, 0},
-      {"collinear hole", {{kSquare, false}, {Contour({{1, 1}, {2, 2}, {3, 3}}), false}}, -1},
-      {"bow tie", {{Contour({{0, 0}, {4, 4}, {4, 0}, {0, 4}}), false}}, -1},
-      {"crossing hole", {{kSquare, false}, {Contour({{1, 1}, {1, 5}, {3, 5}, {3, 1}}), false}}, -1},
-      {"hole sharing a vertex", {{kSquare, false}, {Contour({{0, 0}, {1, 3}, {3, 1}}), false}}, -1},
+      {"clockwise boundary", {{Contour({{0, 0}, {0, 4}, {4, 4}, {4, 0}}), false}}, false, kOrientationMessage.c_str(), 0},
+      {"no contour", {}, false, kOrientationMessage.c_str(), 0},
+      {"hole turning the wrong way", {{kSquare, false}, {kHole, true}}, false, kOrientationMessage.c_str(), 0},
+      {"hole outside", {{kSquare, false}, {Contour({{6, 1}, {6, 3}, {8, 3}, {8, 1}}), false}}, false,
+       kOrientationMessage.c_str(), 0},
+      {"hole above the boundary", {{kSquare, false}, {Contour({{1, 5}, {1, 7}, {3, 7}, {3, 5}}), false}}, false,
+       kOrientationMessage.c_str(), 0},
+      {"island turning the wrong way", {{kSquare, false}, {kHole, false}, {island, true}}, false,
+       kOrientationMessage.c_str(), 0},
+      {"hole touching the boundary", {{kSquare, false}, {Contour({{3, 1}, {2, 2}, {4, 3}}), false}}, false,
+       kOrientationMessage.c_str(), 0},
+      {"collinear boundary", {{Contour({{0, 0}, {1, 1}, {2, 2}}), false}}, false, nullptr, 0},
+      {"collinear hole", {{kSquare, false}, {Contour({{1, 1}, {2, 2}, {3, 3}}), false}}, false, nullptr, 0},
+      {"bow tie", {{Contour({{0, 0}, {4, 4}, {4, 0}, {0, 4}}), false}}, false, nullptr, 0},
+      {"crossing hole", {{kSquare, false}, {Contour({{1, 1}, {1, 5}, {3, 5}, {3, 1}}), false}}, false, nullptr, 0},
+      // The hole is refused by AddContour (its first point repeats a corner).
+      {"hole sharing a vertex", {{kSquare, false}, {Contour({{0, 0}, {1, 3}, {3, 1}}), false}}, true, nullptr, 16},
+      {"square with a hole", {{kSquare, false}, {kHole, false}}, true, nullptr, 12},
+      {"island in a hole", {{kSquare, false}, {kHole, false}, {island, false}}, true, nullptr, 13},
+      {"two boundaries", {{kSquare, false}, {beside, false}, {kHole, false}}, true, nullptr, 13},
   };
   for (const auto& c : cases) {
     SCOPED_TRACE(c.m_Name);
     Polygon polygon;
     std::string output;
     const bool done = Triangulate(polygon, c.m_Contours, &output);
-    if (c.m_Outcome >= 0) {
-      EXPECT_EQ(done, c.m_Outcome == 1);
-    }
+    EXPECT_EQ(done, c.m_bDone);
     if (!done) {
       EXPECT_TRUE(polygon.triangles().empty());
       EXPECT_TRUE(polygon.monotonePieces().empty());
       EXPECT_NE(output.find("triangulation stopped"), std::string::npos);
+      if (c.m_Message != nullptr) {
+        EXPECT_EQ(output, c.m_Message);
+      }
+    } else {
+      double area = 0;
+      for (const Polygon::Triangle& t : polygon.triangles()) {
+        EXPECT_GT(TriangleArea(polygon, t), 0);
+        area += TriangleArea(polygon, t);
+      }
+      EXPECT_EQ(area, c.m_Area);
     }
-    if (c.m_Outcome == 0 && c.m_Contours.size() <= 1) {
-      EXPECT_EQ(output, kOrientationMessage);
-    }
-    // A pass asked for again gives its first outcome and writes nothing.
+  // A pass asked for again gives its first outcome and writes nothing.
     testing::internal::CaptureStdout();
     EXPECT_EQ(polygon.triangulation(), done);
     EXPECT_EQ(testing::internal::GetCapturedStdout(), "");

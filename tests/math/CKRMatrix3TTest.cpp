@@ -255,3 +255,107 @@ TYPED_TEST(CKRMatrix3TTest, SingularValueAndQDUDecompositionsReconstruct) {
   EXPECT_EQ(d(0, 0), Real(0));
   EXPECT_EQ(V3(u.GetRow(0)), V3::UNIT_X);
 }
+
+namespace {
+// Reaches the iteration steps of the decompositions.
+template <class Real, class Other>
+class CKRMatrix3TSteps : public CKRMatrix3T<Real, Other> {
+public:
+  using CKRMatrix3T<Real, Other>::CKRMatrix3T;
+  using CKRMatrix3T<Real, Other>::QLAlgorithm;
+  using CKRMatrix3T<Real, Other>::GolubKahanStep;
+};
+}  // namespace
+
+// Special input ends every decomposition with its documented result:
+// non-finite entries the NaN report, the zero matrix the identity and
+// zeros, extreme scales and repeated eigenvalues a valid decomposition.
+TYPED_TEST(CKRMatrix3TTest, DecompositionsEndOnSpecialInput) {
+  KR_MATH_TEST_TYPES;
+  using Limits = std::numeric_limits<Real>;
+  const double epsilon = TestFixture::kEpsilon;
+  const Real nan = Limits::quiet_NaN(), inf = Limits::infinity(), huge = Limits::max() / 16;
+  const Real tiny = Limits::denorm_min() * 3, small = Limits::min();
+  const Mat3 turn(V3(Real(0.6), Real(0), Real(0.8)), Real(0.5));
+  const struct {
+    const char* m_Name;
+    Mat3 m_Matrix;  // symmetric
+    bool m_bFinite;
+  } cases[] = {
+      {"NaN", Mat3(Real(1), nan, Real(0), nan, Real(2), Real(0), Real(0), Real(0), Real(3)), false},
+      {"infinity", Mat3(inf, Real(1), Real(0), Real(1), Real(2), Real(0), Real(0), Real(0), Real(3)), false},
+      {"minus infinity", Mat3(Real(1), Real(0), -inf, Real(0), Real(2), Real(0), -inf, Real(0), Real(3)), false},
+      {"zero", Mat3::ZERO, true},
+      {"huge", Mat3(huge, -huge, huge / 2, -huge, huge, Real(0), huge / 2, Real(0), -huge), true},
+      {"tiny", Mat3(tiny, tiny, Real(0), tiny, tiny * 2, tiny, Real(0), tiny, tiny), true},
+      {"smallest normal", Mat3(small, small, small), true},
+      {"huge next to tiny", Mat3(huge, tiny, tiny, tiny, tiny, Real(0), tiny, Real(0), Real(1)), true},
+      {"triple eigenvalue", Mat3(Real(2), Real(2), Real(2)), true},
+      {"double eigenvalue", Mat3(turn * Mat3(Real(1), Real(1), Real(2)).TimesTranspose(turn)), true},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.m_Name);
+    const Mat3& m = c.m_Matrix;
+    // Results in the subnormal range keep an absolute error of a few of
+    // their units.
+    const double size = KRMaxEntry(m) + 8 * Limits::denorm_min() / epsilon;
+    Mat3 rot, diag, left, singular, right, q, d, u;
+    m.EigenDecomposition(rot, diag);
+    m.SingularValueDecomposition(left, singular, right);
+    m.QDUDecomposition(q, d, u);
+    Mat2 rot2, diag2;
+    const Mat2 block(m(0, 0), m(0, 1), m(1, 0), m(1, 1));
+    block.EigenDecomposition(rot2, diag2);
+    if (!c.m_bFinite) {
+      EXPECT_EQ(rot, Mat3::IDENTITY);
+      EXPECT_TRUE(std::isnan(diag(0, 0)) && std::isnan(diag(1, 1)) && std::isnan(diag(2, 2)));
+      EXPECT_TRUE(left == Mat3::IDENTITY && right == Mat3::IDENTITY);
+      EXPECT_TRUE(std::isnan(singular(0, 0)) && std::isnan(singular(2, 2)));
+      if (std::isnan(block(0, 1))) {
+        EXPECT_TRUE(rot2 == Mat2::IDENTITY && std::isnan(diag2(0, 0)) && std::isnan(diag2(1, 1)));
+      }
+      continue;
+    }
+    if (m == Mat3::ZERO) {
+      EXPECT_TRUE(rot == Mat3::IDENTITY && diag == Mat3::ZERO);
+      EXPECT_TRUE(left == Mat3::IDENTITY && right == Mat3::IDENTITY && singular == Mat3::ZERO);
+    }
+    // The products are formed in double so that huge entries cannot
+    // overflow on the way back.
+    const auto widen = [](const Mat3& a) { return CKRMatrix3T<double, float>(a(0, 0), a(0, 1), a(0, 2), a(1, 0),
+                                                                             a(1, 1), a(1, 2), a(2, 0), a(2, 1), a(2, 2)); };
+    const auto wide = widen(m);
+    EXPECT_LE(KROrthogonalityError(rot), 16 * epsilon);
+    EXPECT_TRUE(diag(0, 0) <= diag(1, 1) && diag(1, 1) <= diag(2, 2));
+    EXPECT_LE(KRMaxDifference(decltype(wide)(widen(rot) * widen(diag).TimesTranspose(widen(rot))), wide),
+              32 * epsilon * size);
+    EXPECT_LE(KROrthogonalityError(left), 16 * epsilon);
+    EXPECT_LE(KROrthogonalityError(right), 16 * epsilon);
+    EXPECT_TRUE(singular(0, 0) >= singular(1, 1) && singular(1, 1) >= singular(2, 2) && singular(2, 2) >= 0);
+    EXPECT_LE(KRMaxDifference(decltype(wide)(widen(left) * widen(singular).TimesTranspose(widen(right))), wide),
+              32 * epsilon * size);
+    EXPECT_LE(KROrthogonalityError(q), 16 * epsilon);
+    EXPECT_TRUE(d(0, 0) >= 0 && d(1, 1) >= 0 && d(2, 2) >= 0);
+    EXPECT_LE(KRMaxDifference(decltype(wide)(widen(q) * widen(d) * widen(u)), wide), 32 * epsilon * size);
+    EXPECT_TRUE(diag2(0, 0) <= diag2(1, 1));
+    EXPECT_LE(KROrthogonalityError(rot2), 16 * epsilon);
+  }
+  // The iterations stop at their limits on input they cannot converge on.
+  CKRMatrix3TSteps<Real, Other> steps(false);
+  Real dd[3] = {Real(1), nan, Real(2)};
+  Real ee[2] = {nan, Real(1)};
+  EXPECT_FALSE(steps.QLAlgorithm(dd, ee));
+  Real df[3] = {Real(3), Real(1), Real(2)};
+  Real ef[2] = {Real(1), Real(0.5)};
+  EXPECT_TRUE(steps.QLAlgorithm(df, ef));
+  EXPECT_NEAR(df[0] + df[1] + df[2], 6.0, 8 * epsilon);
+  CKRMatrix3TSteps<Real, Other> bidiagonal(Real(1), nan, Real(0), Real(0), Real(2), Real(1), Real(0), Real(0), nan);
+  Mat3 gkLeft(false), gkRight(false);
+  // One step on a non-finite block returns and keeps the NaN (the
+  // decomposition itself reports such input before iterating).
+  CKRMatrix3TSteps<Real, Other>::GolubKahanStep(bidiagonal, gkLeft, gkRight, 0, 2);
+  bool reported = false;
+  for (int e = 0; e < 9; ++e)
+    reported |= std::isnan(bidiagonal(e / 3, e % 3));
+  EXPECT_TRUE(reported);
+}
