@@ -207,13 +207,7 @@ TEST_F(CKRDocumentTest, LongChainSavesAndLoadsOnADefaultStack) {
   for (const auto& [id, object] : objects)
     ASSERT_EQ(object.m_HeaderReads, 1);
   archive->Release();
-  while (first != nullptr) {
-    CKRTestRecord* following = first->m_pNext;
-    first->Release();
-    first = following;
-  }
-  for (CKRTestRecord* record : chain)
-    record->Release();
+  ReleaseChains(first, chain);
 }
 
 TEST_F(CKRDocumentTest, OncePerSessionAndAgainAfterAFailure) {

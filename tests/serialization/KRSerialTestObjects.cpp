@@ -60,3 +60,13 @@ CKRTestRecord* NewRecord(const wchar_t* name, CKRGuid id) {
     record->m_Name = name;
   return record;
 }
+
+void ReleaseChains(CKRTestRecord* first, const std::vector<CKRTestRecord*>& originals) {
+  while (first != nullptr) {
+    CKRTestRecord* following = first->m_pNext;
+    first->Release();
+    first = following;
+  }
+  for (CKRTestRecord* record : originals)
+    record->Release();
+}

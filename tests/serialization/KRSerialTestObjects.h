@@ -5,6 +5,8 @@
 #include <krCoreLib/objectmodel/CKRObjPtrList.h>
 #include <krCoreLib/serialization/CKRSerialObject.h>
 
+#include <vector>
+
 namespace KRTestFields {
 inline constexpr CKRGuid kName = CKRGuid::Literal("{5A000000-0000-4000-8000-000000000001}");
 inline constexpr CKRGuid kCount = CKRGuid::Literal("{5A000000-0000-4000-8000-000000000002}");
@@ -90,3 +92,7 @@ class CKRTestPlain : public CKRObjectImpl {
 
 // A new record through its type.
 CKRTestRecord* NewRecord(const wchar_t* name = L"", CKRGuid id = CKRGuid());
+
+// Releases a chain of records linked through m_pNext, from `first` on, and
+// the records of `originals`.
+void ReleaseChains(CKRTestRecord* first, const std::vector<CKRTestRecord*>& originals);

@@ -272,13 +272,7 @@ TEST_F(CKRXMLFileArchiveTest, LongChainRoundTripsOnADefaultStack) {
     ++length;
   EXPECT_EQ(length, kLength);
   load.Release();
-  while (first != nullptr) {
-    CKRTestRecord* following = first->m_pNext;
-    first->Release();
-    first = following;
-  }
-  for (CKRTestRecord* record : chain)
-    record->Release();
+  ReleaseChains(first, chain);
 }
 
 // Hostile files: each gives false from Open (or loads what it can), never

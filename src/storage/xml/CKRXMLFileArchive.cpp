@@ -196,17 +196,23 @@ CKRBOOL CKRXMLFileArchive::Open(AccessMode mode) {
   }
 }
 
+bool CKRXMLFileArchive::ChooseFileName(bool forSaving, const wchar_t* title) {
+  if (!m_FileName.IsEmpty())
+    return true;
+  SKRFileChooserRequest request;
+  request.m_ForSaving = forSaving;
+  request.m_Title = title;
+  request.m_Filter = kFilter;
+  std::wstring path;
+  if (!SKRFileChooser::Choose(request, path))
+    return false;
+  m_FileName = CKRString(std::move(path));
+  return true;
+}
+
 CKRBOOL CKRXMLFileArchive::OpenWithUI(AccessMode mode) {
-  if (m_FileName.IsEmpty()) {
-    SKRFileChooserRequest request;
-    request.m_ForSaving = false;
-    request.m_Title = L"Open Archive";
-    request.m_Filter = kFilter;
-    std::wstring path;
-    if (!SKRFileChooser::Choose(request, path))
-      return false;
-    m_FileName = CKRString(std::move(path));
-  }
+  if (!ChooseFileName(false, L"Open Archive"))
+    return false;
   return Open(mode);
 }
 
@@ -223,16 +229,8 @@ CKRBOOL CKRXMLFileArchive::Close() {
 }
 
 CKRBOOL CKRXMLFileArchive::CloseWithUI() {
-  if (m_FileName.IsEmpty()) {
-    SKRFileChooserRequest request;
-    request.m_ForSaving = true;
-    request.m_Title = L"Save Archive";
-    request.m_Filter = kFilter;
-    std::wstring path;
-    if (!SKRFileChooser::Choose(request, path))
-      return false;
-    m_FileName = CKRString(std::move(path));
-  }
+  if (!ChooseFileName(true, L"Save Archive"))
+    return false;
   return Close();
 }
 

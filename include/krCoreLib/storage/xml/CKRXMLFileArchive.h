@@ -94,6 +94,9 @@ private:
   void ReleaseTree();
   // Ends this archive's use of the XML library, if it started it.
   void EndLibraryUse();
+  // Asks the file chooser for a file name when none is set; false when
+  // the user cancels (the name stays empty).
+  bool ChooseFileName(bool forSaving, const wchar_t* title);
 
   CKRString m_FileName;
   SKRXMLFileTree* m_pTree = nullptr;  // owned; null while closed
