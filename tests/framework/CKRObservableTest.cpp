@@ -1,6 +1,6 @@
 // Observables: delivery along the observation's type chain, queued and never
 // re-entrant; registration changes during a pass; released observers and
-// observations.
+// observations; an adapter without a listener.
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 
 #include "KRFrameworkTestObjects.h"
@@ -165,9 +165,13 @@ TEST_F(CKRObservableTest, ReleasedObserversAreForgotten) {
   EXPECT_EQ(m_Log, (Log{"victim:1", "killer:1", "survivor:1", "killer:2", "survivor:2"}));
   survivor->Release();  // outside a pass
   Released(survivor);
+  // An adapter without a listener ignores what it hears.
+  auto* adapter = NewObject<CKRObserverAdapter>(CKRObserverAdapter::GetCKRObserverAdapterType());
+  m_pSubject->AddObserver(adapter, kBase);
   m_pSubject->NotifyObservers(Plain());
   EXPECT_EQ(m_Log.size(), 6u);
   // The observable ends first; its observers are released afterwards.
   m_pSubject->Release();
   m_pSubject = NewObject<CKRTestObservable>(CKRTestObservable::GetCKRTestObservableType());
+  adapter->Release();
 }
