@@ -1,10 +1,11 @@
-// Preferences and sections: new objects; round trips
+// Preferences and sections: round trips
 // through the memory store with zero, one and many sections of the base
 // and of a derived class; a stored map naming one section twice.
 #include <krCoreLib/framework/CKRPreferences.h>
 #include <krCoreLib/serialization/CKRFieldT.h>
 
 #include "KRFrameworkStore.h"
+#include "KRFrameworkTestObjects.h"
 #include "KRTestSeed.h"
 
 #include <gtest/gtest.h>
@@ -46,29 +47,13 @@ void CKRTestUnitsSection::CKRTestUnitsSectionType::CreateFields(CKRSerialObjectT
 
 namespace {
 CKRPreferences* NewPreferences() {
-  return static_cast<CKRPreferences*>(CKRPreferences::GetCKRPreferencesType()->CreateInstance(CKRGuid()));
+  return NewObject<CKRPreferences>(CKRPreferences::GetCKRPreferencesType());
 }
 CKRPreferenceSection* NewSection(bool units) {
-  IKRObjectType* type = units ? static_cast<IKRObjectType*>(CKRTestUnitsSection::GetCKRTestUnitsSectionType())
-                              : CKRPreferenceSection::GetCKRPreferenceSectionType();
-  return static_cast<CKRPreferenceSection*>(type->CreateInstance(CKRGuid()));
+  return units ? NewObject<CKRPreferenceSection>(CKRTestUnitsSection::GetCKRTestUnitsSectionType())
+               : NewObject<CKRPreferenceSection>(CKRPreferenceSection::GetCKRPreferenceSectionType());
 }
 }  // namespace
-
-TEST(CKRPreferences, NewObjects) {
-  CKRFrameworkStore types;
-  CKRPreferenceSection* section = NewSection(true);
-  EXPECT_EQ(section->GetName(), L"A Preference Section");
-  EXPECT_EQ(section->GetDescription(), L"A Preference Section");
-  EXPECT_EQ(section->GetFieldDataList().size(), 3u);  // the base's two, then its own
-  CKRPreferences* preferences = NewPreferences();
-  EXPECT_EQ(preferences->GetPreferenceSectionMap().GetCount(), 0);
-  EXPECT_EQ(preferences->GetPreferenceSectionMap().Add(section), 1);
-  EXPECT_EQ(preferences->GetPreferenceSectionMap().Add(section), 0);
-  preferences->Release();  // the sections are not its own
-  EXPECT_EQ(section->GetName(), L"A Preference Section");
-  section->Release();
-}
 
 // Zero, one, two and many sections (base and derived, random IDs) are
 // stored as one link collection and come back with the same IDs in
@@ -113,7 +98,8 @@ TEST(CKRPreferences, RoundTripsWithAnyNumberOfSections) {
   }
 }
 
-// A stored map that names a section twice loads it once.
+// A stored map that names a section twice loads it once. The sections are
+// not the preferences' own: they outlive its release.
 TEST(CKRPreferences, SectionStoredTwiceInTheMapLoadsOnce) {
   CKRFrameworkStore store;
   CKRPreferences* preferences = NewPreferences();
@@ -126,5 +112,7 @@ TEST(CKRPreferences, SectionStoredTwiceInTheMapLoadsOnce) {
   ASSERT_NE(loaded, nullptr);
   EXPECT_EQ(SectionIDs(loaded), std::vector<CKRGuid>{section->GetInstanceID()});
   ReleaseWithSections(loaded);
-  ReleaseWithSections(preferences);
+  preferences->Release();
+  EXPECT_EQ(section->GetName(), L"A Preference Section");
+  section->Release();
 }

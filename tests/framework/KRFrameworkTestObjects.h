@@ -7,6 +7,12 @@
 #include <string>
 #include <vector>
 
+// A new object of `type` as a T.
+template <class T>
+T* NewObject(IKRObjectType* type) {
+  return dynamic_cast<T*>(type->CreateInstance(CKRGuid()));
+}
+
 // Observation types A (derived from CKRObservation) and B (derived from A).
 class CKRTestObservationA : public CKRObservation {
   KR_DECLARE_OBJECT_TYPE(CKRTestObservationA, CKRObjectTypeImpl, "{6A000000-0000-4000-8000-0000000000A1}")

@@ -6,6 +6,8 @@
 
 #include <krCoreLib/framework/CKRGraphNodeVisitor.h>
 
+#include "KRFrameworkTestObjects.h"
+
 #include <functional>
 #include <set>
 #include <string>
@@ -74,11 +76,6 @@ public:
   int VisitNode(CKRGraphNode* node) override;
 };
 
-// A new object of `type` as a T.
-template <class T>
-T* NewObject(IKRObjectType* type) {
-  return dynamic_cast<T*>(type->CreateInstance(CKRGuid()));
-}
 CKRTestPlace* NewPlace(const wchar_t* name, bool town = false);
 // A road of the class `typeID`, joined and connected when it can be.
 CKRTestRoad* NewRoad(CKRGraphNode* primary, CKRGraphNode* secondary, CKRGuid typeID = CKRTestRoad::TypeID);

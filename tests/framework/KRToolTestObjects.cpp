@@ -2,29 +2,11 @@
 
 #include "KRFrameworkTestObjects.h"
 
-#include <sstream>
-
 KR_IMPLEMENT_SERIAL_TYPE(CKRTestTool, CKRTool)
 KR_IMPLEMENT_OBJECT_TYPE(CKRTestView, CKRView)
 
 void CKRTestTool::CKRTestToolType::CreateFields(CKRSerialObjectTypeImpl* target, IKRObject* object) {
   AppendParentFields(target, object);
-}
-
-namespace {
-std::string Describe(int first, unsigned int second, CKRScreenPoint point, const CKRTool::WorldPoint& world) {
-  std::ostringstream text;
-  text << first << ' ' << second << " (" << point.x << ',' << point.y << ") [" << world[0] << ' ' << world[1] << ' '
-       << world[2] << ' ' << world[3] << ']';
-  return text.str();
-}
-}  // namespace
-
-void CKRTestTool::Write(const std::string& text) {
-  if (m_pLog != nullptr)
-    m_pLog->push_back(m_Name + ":" + text);
-  if (m_Hook)
-    m_Hook();
 }
 
 void CKRTestTool::OnUpdate(CKRObservation* observation) {
@@ -39,37 +21,31 @@ int CKRTestTool::OnSetActivated(CKRWnd* window, int activate) {
 }
 
 void CKRTestTool::OnMouseDown(int button, unsigned int flags, CKRScreenPoint point, const WorldPoint& world) {
-  Write("down " + Describe(button, flags, point, world));
+  Write("down", button, flags, point.x, point.y, world[0], world[1], world[2], world[3]);
 }
 void CKRTestTool::OnMouseMove(int button, unsigned int flags, CKRScreenPoint point, const WorldPoint& world) {
-  Write("move " + Describe(button, flags, point, world));
+  Write("move", button, flags, point.x, point.y, world[0], world[1], world[2], world[3]);
 }
 void CKRTestTool::OnMouseUp(int button, unsigned int flags, CKRScreenPoint point, const WorldPoint& world) {
-  Write("up " + Describe(button, flags, point, world));
+  Write("up", button, flags, point.x, point.y, world[0], world[1], world[2], world[3]);
 }
 void CKRTestTool::OnMouseWheel(short delta, unsigned int flags, CKRScreenPoint point, const WorldPoint&) {
-  Write("wheel " + std::to_string(delta) + ' ' + std::to_string(flags) + " (" + std::to_string(point.x) + ',' +
-        std::to_string(point.y) + ')');
+  Write("wheel", delta, flags, point.x, point.y);
 }
 void CKRTestTool::OnMouseLeave() {
   Write("leave");
 }
 void CKRTestTool::OnKeyDown(unsigned int key, unsigned int flags, int third, int fourth) {
-  Write("keydown " + std::to_string(key) + ' ' + std::to_string(flags) + ' ' + std::to_string(third) + ' ' +
-        std::to_string(fourth));
+  Write("keydown", key, flags, third, fourth);
 }
 void CKRTestTool::OnKeyUp(unsigned int key, unsigned int flags, int third, int fourth) {
-  Write("keyup " + std::to_string(key) + ' ' + std::to_string(flags) + ' ' + std::to_string(third) + ' ' +
-        std::to_string(fourth));
+  Write("keyup", key, flags, third, fourth);
 }
 void CKRTestTool::OnPaint(CKRDeviceContext context, int value, CKRScreenSize size, const PaintBound& bound, double scale) {
-  std::ostringstream text;
-  text << "paint " << context.m_Handle << ' ' << value << " (" << size.cx << ',' << size.cy << ") "
-       << (bound.IsEmpty() ? "empty" : "bound") << ' ' << scale;
-  Write(text.str());
+  Write("paint", context.m_Handle, value, size.cx, size.cy, bound.IsEmpty() ? "empty" : "bound", scale);
 }
 void CKRTestTool::OnFocusChanged(bool gained, CKRWnd* window) {
-  Write(std::string(gained ? "focus+ " : "focus- ") + (window != nullptr ? window->GetTitle().ToUtf8() : "null"));
+  Write(gained ? "focus+" : "focus-", window != nullptr ? window->GetTitle().ToUtf8() : "null");
 }
 
 void CKRTestView::OnUpdate(CKRObservation* observation) {

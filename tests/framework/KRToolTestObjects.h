@@ -7,11 +7,13 @@
 #include <krCoreLib/ui/CKRMDIChildWnd.h>
 
 #include <functional>
+#include <sstream>
 #include <string>
 #include <vector>
 
-// Writes each handler call as text to a shared log, prefixed with its name:
-// "t0:down 7 8 (9,10) [1.5 2.5 3.5 1]". Refuses activation when told to.
+// Writes each handler call with its arguments to a shared log, prefixed
+// with its name: "t0:down 7 8 9 -10 1.5 2.5 3.5 1". Refuses activation when
+// told to.
 class CKRTestTool : public CKRTool {
   KR_DECLARE_SERIAL_TYPE(CKRTestTool, CKRSerialObjectTypeImpl, "{6A000000-0000-4000-8000-0000000001A1}")
 
@@ -36,7 +38,16 @@ public:
   void OnFocusChanged(bool gained, CKRWnd* window) override;
 
 private:
-  void Write(const std::string& text);
+  template <class... T>
+  void Write(const char* handler, const T&... arguments) {
+    std::ostringstream text;
+    text << m_Name << ':' << handler;
+    ((text << ' ' << arguments), ...);
+    if (m_pLog != nullptr)
+      m_pLog->push_back(text.str());
+    if (m_Hook)
+      m_Hook();
+  }
 };
 
 class CKRTestView : public CKRView {

@@ -1,17 +1,17 @@
-// What the plug-in tests share: the module folders, a scratch folder, a
-// fixture that starts and ends every test with a fresh manager and type
-// system, and a socket that counts its updates.
+// What the plug-in tests share: the module folders, a fixture that starts
+// and ends every test with a fresh manager and type system, and a socket
+// that counts its updates.
 #pragma once
 
 #include <krCoreLib/krCoreLib.h>
 
 #include "KRExamplePlugins.h"
+#include "KRScratchFolder.h"
 
 #include <gtest/gtest.h>
 
 #include <dlfcn.h>
 
-#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -72,29 +72,6 @@ template <class TSocket>
 TSocket* NewSocket(IKRObjectType* type) {
   return dynamic_cast<TSocket*>(type->CreateInstance(CKRGuid()));
 }
-
-// A scratch folder, removed with its contents.
-class CKRScratchFolder {
-public:
-  CKRScratchFolder() {
-    std::string pattern = (std::filesystem::temp_directory_path() / "krplugins-XXXXXX").string();
-    if (mkdtemp(pattern.data()) != nullptr)
-      m_Path = pattern;
-  }
-  ~CKRScratchFolder() {
-    std::error_code ignored;
-    if (!m_Path.empty())
-      std::filesystem::remove_all(m_Path, ignored);
-  }
-  CKRScratchFolder(const CKRScratchFolder&) = delete;
-  CKRScratchFolder& operator=(const CKRScratchFolder&) = delete;
-
-  const std::string& Path() const { return m_Path; }
-  std::string operator/(const std::string& name) const { return m_Path + "/" + name; }
-
-private:
-  std::string m_Path;
-};
 
 // Every test starts with the host's types claimed and ends with the
 // manager and the type system released.

@@ -1,8 +1,6 @@
 // Field data: values as text, comparison and copy across data types, the
-// flags that decide the property grid's questions, group field data and
-// action pseudo-fields.
+// flags that decide the property grid's questions, and group field data.
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
-#include <krCoreLib/serialization/CKRFieldDataAction.h>
 #include <krCoreLib/serialization/CKRFieldT.h>
 #include <krCoreLib/serialization/CKRGroupFieldData.h>
 
@@ -168,8 +166,6 @@ TEST(CKRFieldDataAdaptor, FlagsDecideOrAskTheObject) {
   CKRString proposed = L"x";
   EXPECT_EQ(orphan->NotifyOfPendingChange(proposed), 0);
   orphan->NotifyOfChange(KRF_VALUE_CHANGED, CKRGuid());
-  EXPECT_EQ(orphan->HasFieldTypeOf(KRDT_STRING), 1);
-  EXPECT_EQ(orphan->HasFieldDataImplTypeOf(KRIMPL_FIELDDATA_VALUE), 1);
   orphan->Release(false);
   object->Release();
 }
@@ -206,11 +202,4 @@ TEST(CKRGroupFieldData, ShowsCommonTextAndSetsEveryMember) {
   EXPECT_EQ(x + y, 10);
   EXPECT_EQ(ints->IsGroupData(), 1);
   ints->Release(true);
-
-  auto* action = new CKRFieldDataAction(kFieldID, L"Recalculate");
-  EXPECT_EQ(action->GetStringValue(), L"Recalculate");
-  EXPECT_EQ(action->GetField(), nullptr);
-  EXPECT_EQ(action->GetActionID(), kFieldID);
-  EXPECT_EQ(action->HasFieldDataImplTypeOf(KRIMPL_FIELDDATA_ACTION), 1);
-  action->Release(true);
 }

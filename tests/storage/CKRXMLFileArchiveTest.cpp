@@ -42,7 +42,7 @@ protected:
     return dynamic_cast<CKRTestRecord*>(document->GetObject(id, CKRTestRecord::TypeID));
   }
 
-  CKRXMLScratch m_Scratch;
+  CKRScratchFolder m_Scratch;
 };
 
 // Runs `body` in a forked child; its result, or -1 when the child did not

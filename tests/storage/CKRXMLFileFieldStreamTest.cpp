@@ -3,7 +3,6 @@
 // fields from hand-made files: missing values, duplicate field elements,
 // names that are no GUID forms, any root name.
 #include <krCoreLib/storage/xml/CKRXMLFileFieldStream.h>
-#include <krCoreLib/storage/xml/CKRXMLFileTypeManifest.h>
 
 #include "KRXMLTestSupport.h"
 
@@ -27,7 +26,7 @@ protected:
     return "<" + KRElementForm(field) + " " + attributes + "/>";
   }
 
-  CKRXMLScratch m_Scratch;
+  CKRScratchFolder m_Scratch;
   const CKRGuid m_ID = CKRGuid::CreateNewGUID();
 };
 
@@ -192,26 +191,4 @@ TEST_F(CKRXMLFileFieldStreamTest, ReadsFieldsAsTheFileHasThem) {
   ASSERT_TRUE(load.m_Opened);
   EXPECT_EQ(load.m_pArchive->GetDocumentCollection()->GetCount(), 1);
   load.Release();
-}
-
-// A stream writes its object element once.
-TEST_F(CKRXMLFileFieldStreamTest, ASecondObjectHeaderIsRefused) {
-  CKRXMLFileArchive* archive = KRNewXMLArchive(m_Scratch.Path("twice.xml"));
-  ASSERT_TRUE(archive->Open(CKRArchive::AccessWrite));
-  CKRDocument* document = archive->CreateNewDocument(kXMLTestDocument, nullptr);
-  CKRTypeManifest* manifest = document->CreateTypeManifest(CKRTestRecord::TypeID, nullptr);
-  ASSERT_NE(dynamic_cast<CKRXMLFileTypeManifest*>(manifest), nullptr);
-  EXPECT_EQ(manifest->WriteTypeHeader(CKRTestRecord::GetCKRTestRecordType()), 1);
-  CKRTestRecord* record = NewRecord();
-  CKRFieldStream* stream = manifest->CreateFieldStream(record->GetInstanceID(), nullptr);
-  ASSERT_NE(dynamic_cast<CKRXMLFileFieldStream*>(stream), nullptr);
-  EXPECT_EQ(stream->WriteObjectHeader(record), 1);
-  EXPECT_EQ(stream->WriteObjectHeader(record), 0);
-  EXPECT_TRUE(archive->Close());
-  archive->Release();
-  const SKRTestElement file = CKRTestXMLReader::Read(KRReadBytes(m_Scratch.Path("twice.xml")));
-  ASSERT_EQ(file.m_Children.size(), 1u);
-  ASSERT_EQ(file.m_Children[0].m_Children.size(), 1u);
-  EXPECT_EQ(file.m_Children[0].m_Children[0].m_Children.size(), 1u);
-  record->Release();
 }

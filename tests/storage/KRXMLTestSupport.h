@@ -1,4 +1,4 @@
-// Helpers of the XML store's tests: a scratch folder, saving and loading
+// Helpers of the XML store's tests: saving and loading
 // test records through an XML file archive, and an independent reader of
 // the written files (plain string scanning, no XML library) for checks of
 // the format byte by byte.
@@ -8,11 +8,11 @@
 #include <krCoreLib/storage/xml/CKRXMLFileArchive.h>
 #include <krCoreLib/storage/xml/CKRXMLFileDocument.h>
 
+#include "KRScratchFolder.h"
 #include "KRSerialTestObjects.h"
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
@@ -25,27 +25,6 @@
 
 inline constexpr CKRGuid kXMLTestRepository = CKRGuid::Literal("{5D000000-0000-4000-8000-0000000000E1}");
 inline constexpr CKRGuid kXMLTestDocument = CKRGuid::Literal("{5D000000-0000-4000-8000-0000000000E2}");
-
-// A folder unique to the test, removed with everything in it.
-class CKRXMLScratch {
-public:
-  CKRXMLScratch() {
-    std::string pattern = (std::filesystem::temp_directory_path() / "krxml-XXXXXX").string();
-    if (::mkdtemp(pattern.data()) == nullptr)
-      std::abort();
-    m_Root = pattern;
-  }
-  ~CKRXMLScratch() {
-    std::error_code error;
-    std::filesystem::permissions(m_Root, std::filesystem::perms::owner_all, error);
-    std::filesystem::remove_all(m_Root, error);
-  }
-  std::string Path(const std::string& name) const { return m_Root + "/" + name; }
-  const std::string& Root() const { return m_Root; }
-
-private:
-  std::string m_Root;
-};
 
 inline std::string KRReadBytes(const std::string& path) {
   std::ifstream in(path, std::ios::binary);
