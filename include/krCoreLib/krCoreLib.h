@@ -50,6 +50,10 @@
 #include <krCoreLib/storage/xml/CKRXMLFileDocument.h>
 #include <krCoreLib/storage/xml/CKRXMLFileFieldStream.h>
 #include <krCoreLib/storage/xml/CKRXMLFileTypeManifest.h>
+#include <krCoreLib/storage/registry/CKRRegistryFieldStream.h>
+#include <krCoreLib/storage/registry/CKRRegistrySerializer.h>
+#include <krCoreLib/storage/registry/CKRRegistryTypeManifest.h>
+#include <krCoreLib/storage/registry/KRRegistryValues.h>
 #include <krCoreLib/platform/KRFileChooser.h>
 
 // Application framework.
