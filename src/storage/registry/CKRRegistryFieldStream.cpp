@@ -62,6 +62,10 @@ int CKRRegistryFieldStream::WriteObjectHeader(IKRObject* object) {
   return m_pSerializer->OpenStored(m_StoredTypeID.GetCString() + L"\\" + object->GetInstanceID().GetCString(), true);
 }
 
+int CKRRegistryFieldStream::ReadObjectHeader(IKRObject* object) {
+  return object != nullptr && m_pSerializer != nullptr ? OpenObjectKey() : 0;
+}
+
 int CKRRegistryFieldStream::Write(IKRFieldData* fieldData) {
   IKRField* field = FieldOf(fieldData);
   if (field == nullptr || m_pSerializer == nullptr)

@@ -29,6 +29,10 @@ public:
   // Creates (volatile) or opens the object's key: 1; 0 for a null object,
   // without a serializer or location, or when the key cannot be created.
   int WriteObjectHeader(IKRObject* object) override;
+  // 1 when the object's key exists; 0 otherwise, so that a link to an
+  // object that was never stored reads as null instead of as an empty
+  // object.
+  int ReadObjectHeader(IKRObject* object) override;
   // 0 without field data, field or serializer; 1 without writing for a
   // field without string storage; otherwise 1 when the field's text was
   // written, 0 when the object's key or the value cannot be written.
