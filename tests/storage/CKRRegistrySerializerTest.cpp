@@ -8,28 +8,11 @@
 #include "KRXMLTestSupport.h"
 
 #include <cstdlib>
-#include <memory>
 #include <set>
 #include <string>
 #include <vector>
 
 namespace {
-
-// Every registry call of this program goes to a store of its own: the
-// folder is set before the first call.
-class CKRRegistryStoreEnvironment : public testing::Environment {
-public:
-  void SetUp() override {
-    m_pScratch = std::make_unique<CKRXMLScratch>();
-    ::setenv("KR_REGISTRY_DIR", m_pScratch->Root().c_str(), 1);
-  }
-  void TearDown() override { m_pScratch.reset(); }
-
-private:
-  std::unique_ptr<CKRXMLScratch> m_pScratch;
-};
-[[maybe_unused]] testing::Environment* const g_RegistryStore =
-    testing::AddGlobalTestEnvironment(new CKRRegistryStoreEnvironment);
 
 using Bytes = std::vector<std::uint8_t>;
 
@@ -56,11 +39,12 @@ T* New(IKRObjectType* type) {
 
 class CKRRegistrySerializerTest : public testing::Test {
 protected:
+  // Every test has a store of its own.
   void SetUp() override {
     CKRTypeSystem::Initialize(kXMLTestRepository);
-    m_Location = L"Software\\krCoreLibTests\\" + CKRGuid::CreateNewGUID().GetCString();
+    ::setenv("KR_REGISTRY_DIR", m_Scratch.Root().c_str(), 1);
   }
-  void TearDown() override { KRRegDeleteKey(HKEY_CURRENT_USER, m_Location.GetString()); }
+  void TearDown() override { ::unsetenv("KR_REGISTRY_DIR"); }
 
   // A serializer at the test's location, opened (loaded) when asked.
   CKRRegistrySerializer* NewSerializer(bool open) {
@@ -115,7 +99,8 @@ protected:
     KRRegCloseKey(key);
   }
 
-  CKRString m_Location;
+  CKRXMLScratch m_Scratch;
+  const CKRString m_Location = L"Software\\krCoreLibTests";
 };
 
 TEST_F(CKRRegistrySerializerTest, StoresObjectsInTheDocumentedLayoutAndLoadsThem) {
@@ -194,6 +179,7 @@ TEST_F(CKRRegistrySerializerTest, TypedValuesRoundTripAndRefuseOtherTypes) {
   EXPECT_EQ(s->Write(L"int", -5), 1);
   EXPECT_EQ(s->Write(L"ulong", 0xFFFFFFFFul), 1);
   EXPECT_EQ(s->Write(L"too wide", 0x100000000ul), 0);
+  EXPECT_EQ(s->Write(L"beyond the store's limit", CKRString(std::size_t(600000), L'x')), 0);
   EXPECT_EQ(s->Write(L"text", text), 1);
   EXPECT_EQ(s->GetLastValueSize(), std::uint32_t(text.GetLength() + 2));  // the emoji is two UTF-16 units
   EXPECT_EQ(s->Write(L"bytes", CKRRegistryByteArray{0, 255, 7}), 1);
@@ -417,22 +403,16 @@ TEST_F(CKRRegistrySerializerTest, PreferencesAndGraphsRoundTrip) {
 }
 
 TEST_F(CKRRegistrySerializerTest, AStoreThatIsNotADatabaseFailsEveryCall) {
-  GTEST_FLAG_SET(death_test_style, "threadsafe");
-  // In a fresh process, before its first registry call.
-  EXPECT_EXIT(
-      {
-        CKRXMLScratch scratch;
-        for (const char* file : {"registry.db", "krCoreLib-volatile-registry.db"})
-          KRWriteBytes(scratch.Path(file), std::string(8192, 'x'));
-        ::setenv("KR_REGISTRY_DIR", scratch.Root().c_str(), 1);
-        CKRRegistrySerializer* s = NewSerializer(false);
-        CKRTestRecord* record = NewRecord(L"lost");
-        int failures = s->Open() == 0 ? 1 : 0;
-        failures += record->SerializeTo(s) == 0 ? 1 : 0;
-        failures += s->CreateKey(HKEY_CURRENT_USER, m_Location) == 0 ? 1 : 0;
-        std::exit(failures == 3 ? 0 : 1);
-      },
-      testing::ExitedWithCode(0), "");
+  for (const char* file : {"registry.db", "krCoreLib-volatile-registry.db"})
+    KRWriteBytes(m_Scratch.Path(file), std::string(8192, 'x'));
+  CKRRegistrySerializer* s = NewSerializer(false);
+  CKRTestRecord* record = NewRecord(L"lost");
+  EXPECT_EQ(s->Open(), 0);
+  EXPECT_EQ(record->SerializeTo(s), 0);
+  EXPECT_EQ(s->CreateKey(HKEY_CURRENT_USER, m_Location), 0);
+  EXPECT_EQ(s->GetLastResult(), KRERROR_ACCESS_DENIED);
+  record->Release();
+  s->Release();
 }
 
 }  // namespace

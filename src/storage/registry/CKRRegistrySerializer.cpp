@@ -18,6 +18,9 @@ namespace {
 // for again; a few rounds settle any writer that is not rewriting it
 // without pause.
 constexpr int kQueryRounds = 4;
+// The store refuses values larger than 1 MiB (KRRegistryAPI.h); a larger
+// size can only come from a damaged store and is not read.
+constexpr std::uint32_t kLargestValue = 1u << 20;
 // Key names in the store are far shorter; a name that does not fit this
 // many characters is skipped rather than read into an ever larger buffer.
 constexpr std::uint32_t kLongestKeyName = 32767;
@@ -236,7 +239,7 @@ bool CKRRegistrySerializer::QueryValue(const CKRString& name, std::uint32_t type
     m_LastResult = KRRegQueryValueEx(m_hCurrentKey, name.GetString(), &storedType, nullptr, &size);
     m_LastValueType = storedType;
     m_LastValueSize = size;
-    if (m_LastResult != KRERROR_SUCCESS || storedType != type)
+    if (m_LastResult != KRERROR_SUCCESS || storedType != type || size > kLargestValue)
       return false;
     // The store tells the size of what it holds: the buffer is never
     // larger than the value.
