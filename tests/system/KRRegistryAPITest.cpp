@@ -202,7 +202,7 @@ TEST_F(CKRRegistryScratch, HandlesAndSubtrees) {
   HKEY reader = nullptr;
   ASSERT_EQ(KRRegOpenKeyEx(HKEY_CURRENT_USER, L"Software\\Top", 0, KRKEY_READ, &reader), 0);
   EXPECT_EQ(Put(reader, L"v", KRREG_SZ, "x"), KRERROR_ACCESS_DENIED);
-  EXPECT_EQ(KRRegDeleteKey(reader, L"Middle"), KRERROR_ACCESS_DENIED);
+  EXPECT_EQ(KRRegDeleteValue(reader, L"v"), KRERROR_ACCESS_DENIED);
   HKEY gone = nullptr;
   EXPECT_EQ(KRRegOpenKeyEx(top, L"Middle\\Missing", 0, KRKEY_READ, &gone), KRERROR_FILE_NOT_FOUND);
 

@@ -28,7 +28,8 @@
 // access only. A handle that was never returned, is already closed, or
 // refers to a key deleted since (or to a volatile key whose store was
 // cleared) gives KRERROR_INVALID_HANDLE; closing it still succeeds for a
-// handle of a deleted key.
+// handle of a deleted key. A forked child must not use the registry before
+// it execs (the store's connection cannot be carried across fork).
 #pragma once
 
 #include <krCoreLib/core/KRExport.h>
@@ -75,7 +76,10 @@ constexpr std::uint32_t KRREG_MULTI_SZ = 7;
 constexpr std::uint32_t KRREG_OPTION_NON_VOLATILE = 0;
 constexpr std::uint32_t KRREG_OPTION_VOLATILE = 1;
 
-// Access masks: read access lets a handle query and enumerate only.
+// Access masks: a handle opened with read access queries and enumerates,
+// and cannot set or delete values of its key. Opening, creating and
+// deleting keys below a handle work through any handle (the desktop
+// registry checks those against the keys, not the handle).
 constexpr std::uint32_t KRKEY_READ = 0x20019;
 constexpr std::uint32_t KRKEY_ALL_ACCESS = 0xF003F;
 
