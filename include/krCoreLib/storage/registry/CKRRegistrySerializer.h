@@ -101,7 +101,8 @@ public:
 
   // --- Values of the current key: 1 on success, 0 on failure.
 
-  // 32-bit number values. An unsigned long above 0xFFFFFFFF is refused.
+  // 32-bit number values (pass an int or an unsigned long; other integer
+  // types need a cast). An unsigned long above 0xFFFFFFFF is refused.
   int Write(const CKRString& name, int value);
   int Write(const CKRString& name, unsigned long value);
   // A string value with its terminator.
