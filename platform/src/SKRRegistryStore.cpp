@@ -393,19 +393,21 @@ const char* Schema(std::int64_t id) {
   return IsVolatile(id) ? "vol" : "main";
 }
 
-// One transaction: rolled back unless committed.
+// One transaction: rolled back unless committed. Its statements are
+// prepared once (compiling BEGIN and COMMIT anew would cost more than a
+// small query).
 class SKRTransaction {
 public:
   SKRTransaction(SKRConnection& connection, bool write) : m_Connection(connection) {
-    m_nResult = m_Connection.Execute(write ? "BEGIN IMMEDIATE" : "BEGIN");
+    m_nResult = Run(write ? "BEGIN IMMEDIATE" : "BEGIN");
   }
   ~SKRTransaction() {
     if (m_nResult == SQLITE_OK)
-      m_Connection.Execute("ROLLBACK");
+      Run("ROLLBACK");
   }
   long Begun() const { return Status(m_nResult); }
   long Commit() {
-    const int result = m_Connection.Execute("COMMIT");
+    const int result = Run("COMMIT");
     if (result == SQLITE_OK) {
       m_nResult = SQLITE_DONE;
       m_Connection.CountWrite();
@@ -414,6 +416,15 @@ public:
   }
 
 private:
+  int Run(const char* sql) {
+    sqlite3_stmt* statement = m_Connection.Statement(sql);
+    if (statement == nullptr)
+      return SQLITE_ERROR;
+    const int result = sqlite3_step(statement);
+    sqlite3_reset(statement);
+    return result == SQLITE_DONE ? SQLITE_OK : result;
+  }
+
   SKRConnection& m_Connection;
   int m_nResult;
 };
@@ -674,9 +685,8 @@ long SKRRegistryStore::QueryValue(HKEY key, const wchar_t* name, std::uint32_t* 
     status = Resolve(connection, key, ref);
   if (status != KRERROR_SUCCESS)
     return status;
-  SKRTransaction transaction(connection, false);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
+  // One statement, so no explicit transaction: the key is looked for only
+  // when the value is missing (a deleted key has no values left).
   // Without a buffer only the size is asked: length() leaves the data unread.
   sqlite3_stmt* statement = connection.Statement(std::string("SELECT type, ") +
                                                  (data != nullptr ? "data" : "length(data)") + " FROM " +
@@ -694,11 +704,14 @@ long SKRRegistryStore::QueryValue(HKEY key, const wchar_t* name, std::uint32_t* 
       status = CopyData(statement, 1, data, size);
     else if (size != nullptr)
       *size = std::uint32_t(sqlite3_column_int64(statement, 1));
-  } else {
-    status = result == SQLITE_DONE ? KRERROR_FILE_NOT_FOUND : Status(result);
+    sqlite3_reset(statement);
+    return status;
   }
   sqlite3_reset(statement);
-  return status;
+  if (result != SQLITE_DONE)
+    return Status(result);
+  status = CheckExists(connection, ref.m_nId);
+  return status == KRERROR_SUCCESS ? KRERROR_FILE_NOT_FOUND : status;
 }
 
 long SKRRegistryStore::SetValue(HKEY key, const wchar_t* name, std::uint32_t type, const std::uint8_t* data,
