@@ -35,6 +35,7 @@
 
 #include <cstdint>
 #include <map>
+#include <string>
 #include <vector>
 
 // The result of every CKRRegistry operation.
@@ -135,8 +136,13 @@ public:
 private:
   // The section key below the base key (all access), or the reason why not.
   _EKRRegistryErrors OpenSection(const wchar_t* section, HKEY key, HKEY& opened) const;
-  _EKRRegistryErrors GetNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t& number, HKEY key);
-  _EKRRegistryErrors PutNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t number, HKEY key);
+  // The bytes of a value of the given type in the section; wrong type: 7.
+  _EKRRegistryErrors ReadEntry(const wchar_t* section, const wchar_t* entry, HKEY key, std::uint32_t type,
+                               std::string& bytes) const;
+  _EKRRegistryErrors WriteEntry(const wchar_t* section, const wchar_t* entry, HKEY key, std::uint32_t type,
+                                const std::string& bytes) const;
+  _EKRRegistryErrors GetNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t& number, HKEY key) const;
+  _EKRRegistryErrors PutNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t number, HKEY key) const;
   void CloseKeys() noexcept;
 
   _EKRRegistryErrors m_eState = KRREGISTRY_NOT_INITIALIZED;
