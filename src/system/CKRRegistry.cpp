@@ -4,6 +4,7 @@
 
 #include <cstring>
 #include <string>
+#include <type_traits>
 
 namespace {
 
@@ -118,6 +119,18 @@ bool ValueNames(HKEY key, std::vector<CKRString>& names) {
   }
 }
 
+// Sets `value` to the default, then to the stored 32 bits (sign-extended for
+// signed types) when `get` reads them.
+template <class T, class Get>
+_EKRRegistryErrors ReadNumber(T& value, T defaultValue, Get get) {
+  value = defaultValue;
+  std::uint32_t number = 0;
+  const _EKRRegistryErrors result = get(number);
+  if (result == KRREGISTRY_SUCCESS)
+    value = std::is_signed_v<T> ? T(std::int32_t(number)) : T(number);
+  return result;
+}
+
 }  // namespace
 
 CKRRegistry::CKRRegistry(const wchar_t* company, const wchar_t* application, HKEY root) {
@@ -213,32 +226,17 @@ _EKRRegistryErrors CKRRegistry::PutNumber(const wchar_t* section, const wchar_t*
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry, int& value,
                                             int defaultValue, HKEY key) {
-  value = defaultValue;
-  std::uint32_t number = 0;
-  const _EKRRegistryErrors result = GetNumber(section, entry, number, key);
-  if (result == KRREGISTRY_SUCCESS)
-    value = std::int32_t(number);
-  return result;
+  return ReadNumber(value, defaultValue, [&](std::uint32_t& number) { return GetNumber(section, entry, number, key); });
 }
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry, long& value,
                                             long defaultValue, HKEY key) {
-  value = defaultValue;
-  std::uint32_t number = 0;
-  const _EKRRegistryErrors result = GetNumber(section, entry, number, key);
-  if (result == KRREGISTRY_SUCCESS)
-    value = std::int32_t(number);
-  return result;
+  return ReadNumber(value, defaultValue, [&](std::uint32_t& number) { return GetNumber(section, entry, number, key); });
 }
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry, unsigned long& value,
                                             unsigned long defaultValue, HKEY key) {
-  value = defaultValue;
-  std::uint32_t number = 0;
-  const _EKRRegistryErrors result = GetNumber(section, entry, number, key);
-  if (result == KRREGISTRY_SUCCESS)
-    value = number;
-  return result;
+  return ReadNumber(value, defaultValue, [&](std::uint32_t& number) { return GetNumber(section, entry, number, key); });
 }
 
 _EKRRegistryErrors CKRRegistry::PutRegValue(const wchar_t* section, const wchar_t* entry, int value, HKEY key) {
