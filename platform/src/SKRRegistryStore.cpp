@@ -289,6 +289,9 @@ private:
       ++m_nVolatileGeneration;
     m_MainIdentity = main;
     m_VolatileIdentity = changing;
+    // A reopened store starts its change counters afresh: no enumeration
+    // may continue from a position found before.
+    ++m_nWrites;
 
     if (sqlite3_open_v2(m_MainPath.c_str(), &m_pDb, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_NOFOLLOW,
                         nullptr) != SQLITE_OK) {

@@ -6,6 +6,9 @@
 
 #include "KRFilesScratch.h"
 
+#include <sqlite3.h>
+
+#include <chrono>
 #include <csignal>
 #include <optional>
 
@@ -369,4 +372,22 @@ TEST_F(CKRRegistryScratch, DamagedOrExposedStoreGivesErrors) {
   ::chmod(Path("elsewhere").c_str(), 0755);
   ::setenv("KR_REGISTRY_DIR", Path("elsewhere").c_str(), 1);
   EXPECT_EQ(KRRegQueryValueEx(HKEY_CURRENT_USER, L"v", nullptr, nullptr, &size), KRERROR_ACCESS_DENIED);
+}
+
+TEST_F(CKRRegistryScratch, WriterLockedOutGivesUpButReadsGoOn) {
+  HKEY key = Create(L"Software\\Locked");
+  ASSERT_EQ(Put(key, L"v", KRREG_SZ, "before"), 0);
+  // Another writer holds the store's write lock past the bounded wait.
+  sqlite3* other = nullptr;
+  ASSERT_EQ(sqlite3_open(Path("registry.db").c_str(), &other), SQLITE_OK);
+  ASSERT_EQ(sqlite3_exec(other, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr), SQLITE_OK);
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_EQ(Put(key, L"v", KRREG_SZ, "during"), KRERROR_ACCESS_DENIED);
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(60)) << "bounded, not a hang";
+  EXPECT_EQ(Get(key, L"v"), "before");
+  sqlite3_exec(other, "ROLLBACK", nullptr, nullptr, nullptr);
+  sqlite3_close(other);
+  EXPECT_EQ(Put(key, L"v", KRREG_SZ, "after"), 0);
+  EXPECT_EQ(Get(key, L"v"), "after");
+  EXPECT_EQ(KRRegCloseKey(key), 0);
 }

@@ -112,8 +112,9 @@ public:
   // Writes the tree below root\subkey to `file` as REGEDIT4 text (8-bit,
   // lines ending in CR LF). The file is written under a temporary name in
   // its folder and renamed over `file` only when everything was written: on
-  // any failure (a key or value unreadable, a short write, nesting beyond
-  // kMaxExportDepth) it returns false and `file` is as it was. Forms:
+  // any failure (a key or value unreadable or larger than kMaxValueSize, a
+  // short write, nesting beyond kMaxExportDepth) it returns false and `file`
+  // is as it was. Forms:
   // - a text (type 1) whose characters all lie below U+0100 as the quoted
   //   text: '"' and '\' escaped with '\', characters 0x20 to 0x7E and 0xA0
   //   to 0xFF as themselves, others as '\' and two hex digits; a text with
