@@ -289,6 +289,9 @@ private:
       ++m_nVolatileGeneration;
     m_MainIdentity = main;
     m_VolatileIdentity = changing;
+    // A reopened store starts its change counters afresh: no enumeration
+    // may continue from a position found before.
+    ++m_nWrites;
 
     if (sqlite3_open_v2(m_MainPath.c_str(), &m_pDb, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_NOFOLLOW,
                         nullptr) != SQLITE_OK) {
@@ -393,19 +396,21 @@ const char* Schema(std::int64_t id) {
   return IsVolatile(id) ? "vol" : "main";
 }
 
-// One transaction: rolled back unless committed.
+// One transaction: rolled back unless committed. Its statements are
+// prepared once (compiling BEGIN and COMMIT anew would cost more than a
+// small query).
 class SKRTransaction {
 public:
   SKRTransaction(SKRConnection& connection, bool write) : m_Connection(connection) {
-    m_nResult = m_Connection.Execute(write ? "BEGIN IMMEDIATE" : "BEGIN");
+    m_nResult = Run(write ? "BEGIN IMMEDIATE" : "BEGIN");
   }
   ~SKRTransaction() {
     if (m_nResult == SQLITE_OK)
-      m_Connection.Execute("ROLLBACK");
+      Run("ROLLBACK");
   }
   long Begun() const { return Status(m_nResult); }
   long Commit() {
-    const int result = m_Connection.Execute("COMMIT");
+    const int result = Run("COMMIT");
     if (result == SQLITE_OK) {
       m_nResult = SQLITE_DONE;
       m_Connection.CountWrite();
@@ -414,6 +419,15 @@ public:
   }
 
 private:
+  int Run(const char* sql) {
+    sqlite3_stmt* statement = m_Connection.Statement(sql);
+    if (statement == nullptr)
+      return SQLITE_ERROR;
+    const int result = sqlite3_step(statement);
+    sqlite3_reset(statement);
+    return result == SQLITE_DONE ? SQLITE_OK : result;
+  }
+
   SKRConnection& m_Connection;
   int m_nResult;
 };
@@ -455,6 +469,13 @@ long CheckExists(SKRConnection& connection, std::int64_t id) {
   return result == SQLITE_ROW ? KRERROR_SUCCESS : result == SQLITE_DONE ? KRERROR_INVALID_HANDLE : Status(result);
 }
 
+// Binds a key id to ?1 and a name or fold to ?2 (kept alive by the caller
+// until the statement is reset).
+void Bind(sqlite3_stmt* statement, std::int64_t id, const SKRBytes& bytes) {
+  sqlite3_bind_int64(statement, 1, id);
+  sqlite3_bind_blob(statement, 2, bytes.data(), int(bytes.size()), SQLITE_STATIC);
+}
+
 // The child of `parent` named `part`: its id, 0 when there is none, -1 on
 // failure.
 std::int64_t FindChild(SKRConnection& connection, std::int64_t parent, const SKRBytes& fold) {
@@ -464,8 +485,7 @@ std::int64_t FindChild(SKRConnection& connection, std::int64_t parent, const SKR
   sqlite3_stmt* statement = connection.Statement(sql);
   if (statement == nullptr)
     return -1;
-  sqlite3_bind_int64(statement, 1, parent);
-  sqlite3_bind_blob(statement, 2, fold.data(), int(fold.size()), SQLITE_STATIC);
+  Bind(statement, parent, fold);
   const int result = sqlite3_step(statement);
   const std::int64_t id = result == SQLITE_ROW ? sqlite3_column_int64(statement, 0) : result == SQLITE_DONE ? 0 : -1;
   sqlite3_reset(statement);
@@ -493,8 +513,7 @@ std::int64_t InsertKey(SKRConnection& connection, std::int64_t parent, bool inVo
     return -1;
   const SKRBytes bytes = NameBytes(name.data(), name.size());
   const SKRBytes fold = FoldBytes(name.data(), name.size());
-  sqlite3_bind_int64(statement, 1, parent);
-  sqlite3_bind_blob(statement, 2, bytes.data(), int(bytes.size()), SQLITE_STATIC);
+  Bind(statement, parent, bytes);
   sqlite3_bind_blob(statement, 3, fold.data(), int(fold.size()), SQLITE_STATIC);
   const int result = sqlite3_step(statement);
   sqlite3_reset(statement);
@@ -558,6 +577,35 @@ long Seek(SKRConnection& connection, SKREnumCursor& cursor, std::uint32_t index,
   return KRERROR_SUCCESS;
 }
 
+
+// How a call uses its key: reading in one statement (no transaction),
+// reading in a transaction, or changing the store (a write transaction),
+// with or without the right to change the key's values.
+enum class EKRCall { Statement, Read, Write, WriteValues };
+
+// Runs `body(connection, ref, transaction)` for the key behind `key` with
+// the store open, the process-wide lock held and, unless kind is
+// Statement, a transaction begun in which the key exists.
+template <class Body>
+long WithKey(HKEY key, EKRCall kind, Body body) {
+  SKRConnection& connection = Connection();
+  std::lock_guard<std::mutex> lock(connection.m_Mutex);
+  long status = connection.Ensure();
+  SKRKeyRef ref;
+  if (status == KRERROR_SUCCESS)
+    status = Resolve(connection, key, ref);
+  if (status != KRERROR_SUCCESS)
+    return status;
+  if (kind == EKRCall::WriteValues && !ref.m_bWritable)
+    return KRERROR_ACCESS_DENIED;
+  if (kind == EKRCall::Statement)
+    return body(connection, ref, static_cast<SKRTransaction*>(nullptr));
+  SKRTransaction transaction(connection, kind != EKRCall::Read);
+  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
+    return status;
+  return body(connection, ref, &transaction);
+}
+
 }  // namespace
 
 long SKRRegistryStore::OpenKey(HKEY key, const wchar_t* subKey, std::uint32_t access, bool create,
@@ -568,95 +616,80 @@ long SKRRegistryStore::OpenKey(HKEY key, const wchar_t* subKey, std::uint32_t ac
   std::vector<std::wstring> parts;
   if (!SplitPath(subKey, parts) || (create && (options & ~KRREG_OPTION_VOLATILE) != 0))
     return KRERROR_INVALID_PARAMETER;
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef parent;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, parent);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  SKRTransaction transaction(connection, create);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, parent.m_nId)))
-    return status;
-  std::int64_t id = parent.m_nId;
-  bool created = false;
-  for (const std::wstring& part : parts) {
-    const std::int64_t child = FindChild(connection, id, FoldBytes(part.data(), part.size()));
-    if (child < 0)
-      return KRERROR_ACCESS_DENIED;
-    if (child > 0) {
-      id = child;
-      continue;
+  return WithKey(key, create ? EKRCall::Write : EKRCall::Read,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction* transaction) -> long {
+    long status = KRERROR_SUCCESS;
+    std::int64_t id = ref.m_nId;
+    bool created = false;
+    for (const std::wstring& part : parts) {
+      const std::int64_t child = FindChild(connection, id, FoldBytes(part.data(), part.size()));
+      if (child < 0)
+        return KRERROR_ACCESS_DENIED;
+      if (child > 0) {
+        id = child;
+        continue;
+      }
+      if (!create)
+        return KRERROR_FILE_NOT_FOUND;
+      const bool inVolatile = IsVolatile(id) || (options & KRREG_OPTION_VOLATILE) != 0;
+      if (IsVolatile(id) && (options & KRREG_OPTION_VOLATILE) == 0)
+        return KRERROR_CHILD_MUST_BE_VOLATILE;
+      if ((id = InsertKey(connection, id, inVolatile, part)) < 0)
+        return KRERROR_ACCESS_DENIED;
+      created = true;
     }
-    if (!create)
-      return KRERROR_FILE_NOT_FOUND;
-    const bool inVolatile = IsVolatile(id) || (options & KRREG_OPTION_VOLATILE) != 0;
-    if (IsVolatile(id) && (options & KRREG_OPTION_VOLATILE) == 0)
-      return KRERROR_CHILD_MUST_BE_VOLATILE;
-    if ((id = InsertKey(connection, id, inVolatile, part)) < 0)
-      return KRERROR_ACCESS_DENIED;
-    created = true;
-  }
-  if (created && (status = transaction.Commit()) != KRERROR_SUCCESS)
-    return status;
-  auto* handle = new SKRRegKey;
-  handle->m_nId = id;
-  handle->m_nGeneration = connection.Generation(id);
-  handle->m_bWritable = (access & kWriteAccess) != 0;
-  connection.m_Handles.insert(handle);
-  *result = handle;
-  if (disposition != nullptr)
-    *disposition = created ? KRREG_CREATED_NEW_KEY : KRREG_OPENED_EXISTING_KEY;
-  return KRERROR_SUCCESS;
+    if (created && (status = transaction->Commit()) != KRERROR_SUCCESS)
+      return status;
+    auto* handle = new SKRRegKey;
+    handle->m_nId = id;
+    handle->m_nGeneration = connection.Generation(id);
+    handle->m_bWritable = (access & kWriteAccess) != 0;
+    connection.m_Handles.insert(handle);
+    *result = handle;
+    if (disposition != nullptr)
+      *disposition = created ? KRREG_CREATED_NEW_KEY : KRREG_OPENED_EXISTING_KEY;
+    return KRERROR_SUCCESS;
+  });
 }
 
 long SKRRegistryStore::QueryInfo(HKEY key, std::uint32_t* subKeys, std::uint32_t* maxSubKeyLength,
                                  std::uint32_t* values, std::uint32_t* maxValueNameLength,
                                  std::uint32_t* maxValueLength) {
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef ref;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, ref);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  SKRTransaction transaction(connection, false);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
-  const std::string keys = "SELECT count(*), coalesce(max(length(name)), 0), 0 FROM %s.keys WHERE parent = ?1";
-  const std::string vals = std::string("SELECT count(*), coalesce(max(length(name)), 0), "
-                                       "coalesce(max(length(data)), 0) FROM ") +
-                           Schema(ref.m_nId) + ".vals WHERE key = ?1";
-  std::int64_t totals[2][3] = {};
-  const std::string sqls[3] = {std::string(keys).replace(keys.find("%s"), 2, "main"),
-                               std::string(keys).replace(keys.find("%s"), 2, "vol"), vals};
-  for (int i = 0; i < 3; ++i) {
-    sqlite3_stmt* statement = connection.Statement(sqls[i]);
-    if (statement == nullptr)
-      return KRERROR_ACCESS_DENIED;
-    sqlite3_bind_int64(statement, 1, ref.m_nId);
-    if (sqlite3_step(statement) != SQLITE_ROW) {
+  return WithKey(key, EKRCall::Read,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction*) -> long {
+    const std::string keys = "SELECT count(*), coalesce(max(length(name)), 0), 0 FROM %s.keys WHERE parent = ?1";
+    const std::string vals = std::string("SELECT count(*), coalesce(max(length(name)), 0), "
+                                         "coalesce(max(length(data)), 0) FROM ") +
+                             Schema(ref.m_nId) + ".vals WHERE key = ?1";
+    std::int64_t totals[2][3] = {};
+    const std::string sqls[3] = {std::string(keys).replace(keys.find("%s"), 2, "main"),
+                                 std::string(keys).replace(keys.find("%s"), 2, "vol"), vals};
+    for (int i = 0; i < 3; ++i) {
+      sqlite3_stmt* statement = connection.Statement(sqls[i]);
+      if (statement == nullptr)
+        return KRERROR_ACCESS_DENIED;
+      sqlite3_bind_int64(statement, 1, ref.m_nId);
+      if (sqlite3_step(statement) != SQLITE_ROW) {
+        sqlite3_reset(statement);
+        return KRERROR_ACCESS_DENIED;
+      }
+      std::int64_t* row = totals[i == 2 ? 1 : 0];
+      row[0] += sqlite3_column_int64(statement, 0);
+      row[1] = std::max<std::int64_t>(row[1], sqlite3_column_int64(statement, 1) / std::int64_t(sizeof(wchar_t)));
+      row[2] = std::max<std::int64_t>(row[2], sqlite3_column_int64(statement, 2));
       sqlite3_reset(statement);
-      return KRERROR_ACCESS_DENIED;
     }
-    std::int64_t* row = totals[i == 2 ? 1 : 0];
-    row[0] += sqlite3_column_int64(statement, 0);
-    row[1] = std::max<std::int64_t>(row[1], sqlite3_column_int64(statement, 1) / std::int64_t(sizeof(wchar_t)));
-    row[2] = std::max<std::int64_t>(row[2], sqlite3_column_int64(statement, 2));
-    sqlite3_reset(statement);
-  }
-  const auto out = [](std::uint32_t* target, std::int64_t value) {
-    if (target != nullptr)
-      *target = std::uint32_t(std::min<std::int64_t>(value, UINT32_MAX));
-  };
-  out(subKeys, totals[0][0]);
-  out(maxSubKeyLength, totals[0][1]);
-  out(values, totals[1][0]);
-  out(maxValueNameLength, totals[1][1]);
-  out(maxValueLength, totals[1][2]);
-  return KRERROR_SUCCESS;
+    const auto out = [](std::uint32_t* target, std::int64_t value) {
+      if (target != nullptr)
+        *target = std::uint32_t(std::min<std::int64_t>(value, UINT32_MAX));
+    };
+    out(subKeys, totals[0][0]);
+    out(maxSubKeyLength, totals[0][1]);
+    out(values, totals[1][0]);
+    out(maxValueNameLength, totals[1][1]);
+    out(maxValueLength, totals[1][2]);
+    return KRERROR_SUCCESS;
+  });
 }
 
 long SKRRegistryStore::QueryValue(HKEY key, const wchar_t* name, std::uint32_t* type, std::uint8_t* data,
@@ -666,39 +699,36 @@ long SKRRegistryStore::QueryValue(HKEY key, const wchar_t* name, std::uint32_t* 
   const std::size_t nameLength = ValueNameLength(name);
   if (nameLength > kMaxValueNameLength)
     return KRERROR_FILE_NOT_FOUND;
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef ref;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, ref);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  SKRTransaction transaction(connection, false);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
-  // Without a buffer only the size is asked: length() leaves the data unread.
-  sqlite3_stmt* statement = connection.Statement(std::string("SELECT type, ") +
-                                                 (data != nullptr ? "data" : "length(data)") + " FROM " +
-                                                 Schema(ref.m_nId) + ".vals WHERE key = ?1 AND fold = ?2");
-  if (statement == nullptr)
-    return KRERROR_ACCESS_DENIED;
-  const SKRBytes fold = FoldBytes(name != nullptr ? name : L"", nameLength);
-  sqlite3_bind_int64(statement, 1, ref.m_nId);
-  sqlite3_bind_blob(statement, 2, fold.data(), int(fold.size()), SQLITE_STATIC);
-  const int result = sqlite3_step(statement);
-  if (result == SQLITE_ROW) {
-    if (type != nullptr)
-      *type = std::uint32_t(sqlite3_column_int64(statement, 0));
-    if (data != nullptr)
-      status = CopyData(statement, 1, data, size);
-    else if (size != nullptr)
-      *size = std::uint32_t(sqlite3_column_int64(statement, 1));
-  } else {
-    status = result == SQLITE_DONE ? KRERROR_FILE_NOT_FOUND : Status(result);
-  }
-  sqlite3_reset(statement);
-  return status;
+  return WithKey(key, EKRCall::Statement,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction*) -> long {
+    long status = KRERROR_SUCCESS;
+    // One statement, so no explicit transaction: the key is looked for only
+    // when the value is missing (a deleted key has no values left).
+    // Without a buffer only the size is asked: length() leaves the data unread.
+    sqlite3_stmt* statement = connection.Statement(std::string("SELECT type, ") +
+                                                   (data != nullptr ? "data" : "length(data)") + " FROM " +
+                                                   Schema(ref.m_nId) + ".vals WHERE key = ?1 AND fold = ?2");
+    if (statement == nullptr)
+      return KRERROR_ACCESS_DENIED;
+    const SKRBytes fold = FoldBytes(name != nullptr ? name : L"", nameLength);
+    Bind(statement, ref.m_nId, fold);
+    const int result = sqlite3_step(statement);
+    if (result == SQLITE_ROW) {
+      if (type != nullptr)
+        *type = std::uint32_t(sqlite3_column_int64(statement, 0));
+      if (data != nullptr)
+        status = CopyData(statement, 1, data, size);
+      else if (size != nullptr)
+        *size = std::uint32_t(sqlite3_column_int64(statement, 1));
+      sqlite3_reset(statement);
+      return status;
+    }
+    sqlite3_reset(statement);
+    if (result != SQLITE_DONE)
+      return Status(result);
+    status = CheckExists(connection, ref.m_nId);
+    return status == KRERROR_SUCCESS ? KRERROR_FILE_NOT_FOUND : status;
+  });
 }
 
 long SKRRegistryStore::SetValue(HKEY key, const wchar_t* name, std::uint32_t type, const std::uint8_t* data,
@@ -706,73 +736,54 @@ long SKRRegistryStore::SetValue(HKEY key, const wchar_t* name, std::uint32_t typ
   const std::size_t nameLength = ValueNameLength(name);
   if (nameLength > kMaxValueNameLength || size > kMaxValueSize || (data == nullptr && size > 0))
     return KRERROR_INVALID_PARAMETER;
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef ref;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, ref);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  if (!ref.m_bWritable)
-    return KRERROR_ACCESS_DENIED;
-  SKRTransaction transaction(connection, true);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
-  // A new value goes after the last; a replaced one keeps its place (and the
-  // case of its first name).
-  const std::string schema = Schema(ref.m_nId);
-  sqlite3_stmt* statement = connection.Statement(
-      "INSERT INTO " + schema + ".vals(key, seq, name, fold, type, data) VALUES(?1, (SELECT coalesce(max(seq), 0) + 1 FROM " +
-      schema + ".vals WHERE key = ?1), ?2, ?3, ?4, ?5) ON CONFLICT(key, fold) DO UPDATE SET type = excluded.type, "
-               "data = excluded.data");
-  if (statement == nullptr)
-    return KRERROR_ACCESS_DENIED;
-  const wchar_t* text = name != nullptr ? name : L"";
-  const SKRBytes bytes = NameBytes(text, nameLength);
-  const SKRBytes fold = FoldBytes(text, nameLength);
-  sqlite3_bind_int64(statement, 1, ref.m_nId);
-  sqlite3_bind_blob(statement, 2, bytes.data(), int(bytes.size()), SQLITE_STATIC);
-  sqlite3_bind_blob(statement, 3, fold.data(), int(fold.size()), SQLITE_STATIC);
-  sqlite3_bind_int64(statement, 4, type);
-  sqlite3_bind_blob(statement, 5, size > 0 ? static_cast<const void*>(data) : "", int(size), SQLITE_STATIC);
-  const int result = sqlite3_step(statement);
-  sqlite3_reset(statement);
-  if (result != SQLITE_DONE)
-    return Status(result);
-  return transaction.Commit();
+  return WithKey(key, EKRCall::WriteValues,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction* transaction) -> long {
+    // A new value goes after the last; a replaced one keeps its place (and the
+    // case of its first name).
+    const std::string schema = Schema(ref.m_nId);
+    sqlite3_stmt* statement = connection.Statement(
+        "INSERT INTO " + schema + ".vals(key, seq, name, fold, type, data) VALUES(?1, "
+        "(SELECT coalesce(max(seq), 0) + 1 FROM " + schema + ".vals WHERE key = ?1), ?2, ?3, ?4, ?5) "
+        "ON CONFLICT(key, fold) DO UPDATE SET type = excluded.type, data = excluded.data");
+    if (statement == nullptr)
+      return KRERROR_ACCESS_DENIED;
+    const wchar_t* text = name != nullptr ? name : L"";
+    const SKRBytes bytes = NameBytes(text, nameLength);
+    const SKRBytes fold = FoldBytes(text, nameLength);
+    Bind(statement, ref.m_nId, bytes);
+    sqlite3_bind_blob(statement, 3, fold.data(), int(fold.size()), SQLITE_STATIC);
+    sqlite3_bind_int64(statement, 4, type);
+    sqlite3_bind_blob(statement, 5, size > 0 ? static_cast<const void*>(data) : "", int(size), SQLITE_STATIC);
+    const int result = sqlite3_step(statement);
+    sqlite3_reset(statement);
+    if (result != SQLITE_DONE)
+      return Status(result);
+    return transaction->Commit();
+  });
 }
 
 long SKRRegistryStore::EnumValue(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength,
                                  std::uint32_t* type, std::uint8_t* data, std::uint32_t* size) {
   if (name == nullptr || nameLength == nullptr || (data != nullptr && size == nullptr))
     return KRERROR_INVALID_PARAMETER;
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef ref;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, ref);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  SKRTransaction transaction(connection, false);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
-  sqlite3_stmt* statement =
-      connection.Statement(std::string("SELECT seq, name, type, data FROM ") + Schema(ref.m_nId) +
-                           ".vals WHERE key = ?1 AND seq > ?2 ORDER BY seq LIMIT 1");
-  if (statement == nullptr)
-    return KRERROR_ACCESS_DENIED;
-  status = Seek(connection, *ref.m_pValues, index, [&](SKREnumCursor& cursor) {
-    sqlite3_reset(statement);
-    sqlite3_bind_int64(statement, 1, ref.m_nId);
-    sqlite3_bind_int64(statement, 2, cursor.m_nSeq);
-    const int result = sqlite3_step(statement);
-    if (result == SQLITE_ROW) {
-      cursor.m_nSeq = sqlite3_column_int64(statement, 0);
-      return KRERROR_SUCCESS;
-    }
-    return result == SQLITE_DONE ? KRERROR_NO_MORE_ITEMS : Status(result);
+  return WithKey(key, EKRCall::Read,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction*) -> long {
+    long status = KRERROR_SUCCESS;
+    sqlite3_stmt* statement =
+        connection.Statement(std::string("SELECT seq, name, type, data FROM ") + Schema(ref.m_nId) +
+                             ".vals WHERE key = ?1 AND seq > ?2 ORDER BY seq LIMIT 1");
+    if (statement == nullptr)
+      return KRERROR_ACCESS_DENIED;
+    status = Seek(connection, *ref.m_pValues, index, [&](SKREnumCursor& cursor) {
+      sqlite3_reset(statement);
+      sqlite3_bind_int64(statement, 1, ref.m_nId);
+      sqlite3_bind_int64(statement, 2, cursor.m_nSeq);
+      const int result = sqlite3_step(statement);
+      if (result == SQLITE_ROW) {
+        cursor.m_nSeq = sqlite3_column_int64(statement, 0);
+        return KRERROR_SUCCESS;
+      }
+      return result == SQLITE_DONE ? KRERROR_NO_MORE_ITEMS : Status(result);
   });
   if (status == KRERROR_SUCCESS) {
     // The statement still stands on the item the cursor reached; when the
@@ -797,165 +808,139 @@ long SKRRegistryStore::EnumValue(HKEY key, std::uint32_t index, wchar_t* name, s
   }
   sqlite3_reset(statement);
   return status;
+  });
 }
 
 long SKRRegistryStore::EnumKey(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength) {
   if (name == nullptr || nameLength == nullptr)
     return KRERROR_INVALID_PARAMETER;
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef ref;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, ref);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  SKRTransaction transaction(connection, false);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
-  // The next child after a fold, from either store: the smaller of the two.
-  SKRBytes foundName;
-  const auto next = [&](SKREnumCursor& cursor) {
-    bool found = false;
-    SKRBytes best;
-    for (const char* schema : {"main", "vol"}) {
-      if (IsVolatile(ref.m_nId) && schema[0] == 'm')
-        continue;
-      sqlite3_stmt* statement = connection.Statement(std::string("SELECT fold, name FROM ") + schema +
-                                                     ".keys WHERE parent = ?1 AND fold > ?2 ORDER BY fold LIMIT 1");
-      if (statement == nullptr)
-        return KRERROR_ACCESS_DENIED;
-      sqlite3_bind_int64(statement, 1, ref.m_nId);
-      sqlite3_bind_blob(statement, 2, cursor.m_Fold.data(), int(cursor.m_Fold.size()), SQLITE_STATIC);
-      const int result = sqlite3_step(statement);
-      if (result == SQLITE_ROW) {
-        SKRBytes fold(static_cast<const char*>(sqlite3_column_blob(statement, 0)),
-                      std::size_t(sqlite3_column_bytes(statement, 0)));
-        if (!found || fold < best) {
-          best.swap(fold);
-          foundName.assign(static_cast<const char*>(sqlite3_column_blob(statement, 1)),
-                           std::size_t(sqlite3_column_bytes(statement, 1)));
-          found = true;
+  return WithKey(key, EKRCall::Read,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction*) -> long {
+    long status = KRERROR_SUCCESS;
+    // The next child after a fold, from either store: the smaller of the two.
+    SKRBytes foundName;
+    const auto next = [&](SKREnumCursor& cursor) {
+      bool found = false;
+      SKRBytes best;
+      for (const char* schema : {"main", "vol"}) {
+        if (IsVolatile(ref.m_nId) && schema[0] == 'm')
+          continue;
+        sqlite3_stmt* statement = connection.Statement(std::string("SELECT fold, name FROM ") + schema +
+                                                       ".keys WHERE parent = ?1 AND fold > ?2 ORDER BY fold LIMIT 1");
+        if (statement == nullptr)
+          return KRERROR_ACCESS_DENIED;
+        Bind(statement, ref.m_nId, cursor.m_Fold);
+        const int result = sqlite3_step(statement);
+        if (result == SQLITE_ROW) {
+          SKRBytes fold(static_cast<const char*>(sqlite3_column_blob(statement, 0)),
+                        std::size_t(sqlite3_column_bytes(statement, 0)));
+          if (!found || fold < best) {
+            best.swap(fold);
+            foundName.assign(static_cast<const char*>(sqlite3_column_blob(statement, 1)),
+                             std::size_t(sqlite3_column_bytes(statement, 1)));
+            found = true;
+          }
         }
+        sqlite3_reset(statement);
+        if (result != SQLITE_ROW && result != SQLITE_DONE)
+          return Status(result);
       }
-      sqlite3_reset(statement);
-      if (result != SQLITE_ROW && result != SQLITE_DONE)
-        return Status(result);
-    }
-    if (!found)
-      return KRERROR_NO_MORE_ITEMS;
-    cursor.m_Fold.swap(best);
-    return KRERROR_SUCCESS;
-  };
-  SKREnumCursor& cursor = *ref.m_pKeys;
-  status = Seek(connection, cursor, index, next);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  if (foundName.empty()) {
-    // The cursor already stood on the item: look its name up by its fold.
-    for (const char* schema : {"main", "vol"}) {
-      sqlite3_stmt* statement = connection.Statement(std::string("SELECT name FROM ") + schema +
-                                                     ".keys WHERE parent = ?1 AND fold = ?2");
-      if (statement == nullptr)
+      if (!found)
+        return KRERROR_NO_MORE_ITEMS;
+      cursor.m_Fold.swap(best);
+      return KRERROR_SUCCESS;
+    };
+    SKREnumCursor& cursor = *ref.m_pKeys;
+    status = Seek(connection, cursor, index, next);
+    if (status != KRERROR_SUCCESS)
+      return status;
+    if (foundName.empty()) {
+      // The cursor already stood on the item: look its name up by its fold.
+      for (const char* schema : {"main", "vol"}) {
+        sqlite3_stmt* statement = connection.Statement(std::string("SELECT name FROM ") + schema +
+                                                       ".keys WHERE parent = ?1 AND fold = ?2");
+        if (statement == nullptr)
+          return KRERROR_ACCESS_DENIED;
+        Bind(statement, ref.m_nId, cursor.m_Fold);
+        if (sqlite3_step(statement) == SQLITE_ROW)
+          foundName.assign(static_cast<const char*>(sqlite3_column_blob(statement, 0)),
+                           std::size_t(sqlite3_column_bytes(statement, 0)));
+        sqlite3_reset(statement);
+        if (!foundName.empty())
+          break;
+      }
+      if (foundName.empty())
         return KRERROR_ACCESS_DENIED;
-      sqlite3_bind_int64(statement, 1, ref.m_nId);
-      sqlite3_bind_blob(statement, 2, cursor.m_Fold.data(), int(cursor.m_Fold.size()), SQLITE_STATIC);
-      if (sqlite3_step(statement) == SQLITE_ROW)
-        foundName.assign(static_cast<const char*>(sqlite3_column_blob(statement, 0)),
-                         std::size_t(sqlite3_column_bytes(statement, 0)));
-      sqlite3_reset(statement);
-      if (!foundName.empty())
-        break;
     }
-    if (foundName.empty())
-      return KRERROR_ACCESS_DENIED;
-  }
-  return CopyName(foundName.data(), int(foundName.size()), name, nameLength);
+    return CopyName(foundName.data(), int(foundName.size()), name, nameLength);
+  });
 }
 
 long SKRRegistryStore::DeleteValue(HKEY key, const wchar_t* name) {
   const std::size_t nameLength = ValueNameLength(name);
   if (nameLength > kMaxValueNameLength)
     return KRERROR_FILE_NOT_FOUND;
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef ref;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, ref);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  if (!ref.m_bWritable)
-    return KRERROR_ACCESS_DENIED;
-  SKRTransaction transaction(connection, true);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
-  sqlite3_stmt* statement =
-      connection.Statement(std::string("DELETE FROM ") + Schema(ref.m_nId) + ".vals WHERE key = ?1 AND fold = ?2");
-  if (statement == nullptr)
-    return KRERROR_ACCESS_DENIED;
-  const SKRBytes fold = FoldBytes(name != nullptr ? name : L"", nameLength);
-  sqlite3_bind_int64(statement, 1, ref.m_nId);
-  sqlite3_bind_blob(statement, 2, fold.data(), int(fold.size()), SQLITE_STATIC);
-  const int result = sqlite3_step(statement);
-  sqlite3_reset(statement);
-  if (result != SQLITE_DONE)
-    return Status(result);
-  if (sqlite3_changes(connection.Database()) == 0)
-    return KRERROR_FILE_NOT_FOUND;
-  return transaction.Commit();
+  return WithKey(key, EKRCall::WriteValues,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction* transaction) -> long {
+    sqlite3_stmt* statement =
+        connection.Statement(std::string("DELETE FROM ") + Schema(ref.m_nId) + ".vals WHERE key = ?1 AND fold = ?2");
+    if (statement == nullptr)
+      return KRERROR_ACCESS_DENIED;
+    const SKRBytes fold = FoldBytes(name != nullptr ? name : L"", nameLength);
+    Bind(statement, ref.m_nId, fold);
+    const int result = sqlite3_step(statement);
+    sqlite3_reset(statement);
+    if (result != SQLITE_DONE)
+      return Status(result);
+    if (sqlite3_changes(connection.Database()) == 0)
+      return KRERROR_FILE_NOT_FOUND;
+    return transaction->Commit();
+  });
 }
 
 long SKRRegistryStore::DeleteKey(HKEY key, const wchar_t* subKey) {
   std::vector<std::wstring> parts;
   if (subKey == nullptr || subKey[0] == L'\0' || !SplitPath(subKey, parts))
     return KRERROR_INVALID_PARAMETER;
-  SKRConnection& connection = Connection();
-  std::lock_guard<std::mutex> lock(connection.m_Mutex);
-  long status = connection.Ensure();
-  SKRKeyRef ref;
-  if (status == KRERROR_SUCCESS)
-    status = Resolve(connection, key, ref);
-  if (status != KRERROR_SUCCESS)
-    return status;
-  SKRTransaction transaction(connection, true);
-  if ((status = transaction.Begun()) != KRERROR_SUCCESS || (status = CheckExists(connection, ref.m_nId)))
-    return status;
-  std::int64_t id = ref.m_nId;
-  if ((status = Walk(connection, id, parts)) != KRERROR_SUCCESS)
-    return status;
-  // The subtree's ids; UNION (not UNION ALL) ends even on a damaged store
-  // whose parent links form a loop.
-  sqlite3_stmt* statement = connection.Statement(
-      "WITH RECURSIVE tree(id) AS (SELECT ?1 UNION SELECT k.id FROM (SELECT id, parent FROM main.keys UNION ALL "
-      "SELECT id, parent FROM vol.keys) AS k JOIN tree ON k.parent = tree.id) SELECT id FROM tree");
-  if (statement == nullptr)
-    return KRERROR_ACCESS_DENIED;
-  sqlite3_bind_int64(statement, 1, id);
-  std::vector<std::int64_t> ids;
-  int result;
-  while ((result = sqlite3_step(statement)) == SQLITE_ROW)
-    ids.push_back(sqlite3_column_int64(statement, 0));
-  sqlite3_reset(statement);
-  if (result != SQLITE_DONE)
-    return Status(result);
-  for (const std::int64_t doomed : ids) {
-    if (doomed <= kRootCount)
-      continue;
-    for (const char* sql : {"DELETE FROM %s.vals WHERE key = ?1", "DELETE FROM %s.keys WHERE id = ?1"}) {
-      std::string text = sql;
-      text.replace(text.find("%s"), 2, Schema(doomed));
-      sqlite3_stmt* deletion = connection.Statement(text);
-      if (deletion == nullptr)
-        return KRERROR_ACCESS_DENIED;
-      sqlite3_bind_int64(deletion, 1, doomed);
-      result = sqlite3_step(deletion);
-      sqlite3_reset(deletion);
-      if (result != SQLITE_DONE)
-        return Status(result);
+  return WithKey(key, EKRCall::Write,
+                 [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction* transaction) -> long {
+    long status = KRERROR_SUCCESS;
+    std::int64_t id = ref.m_nId;
+    if ((status = Walk(connection, id, parts)) != KRERROR_SUCCESS)
+      return status;
+    // The subtree's ids; UNION (not UNION ALL) ends even on a damaged store
+    // whose parent links form a loop.
+    sqlite3_stmt* statement = connection.Statement(
+        "WITH RECURSIVE tree(id) AS (SELECT ?1 UNION SELECT k.id FROM (SELECT id, parent FROM main.keys UNION ALL "
+        "SELECT id, parent FROM vol.keys) AS k JOIN tree ON k.parent = tree.id) SELECT id FROM tree");
+    if (statement == nullptr)
+      return KRERROR_ACCESS_DENIED;
+    sqlite3_bind_int64(statement, 1, id);
+    std::vector<std::int64_t> ids;
+    int result;
+    while ((result = sqlite3_step(statement)) == SQLITE_ROW)
+      ids.push_back(sqlite3_column_int64(statement, 0));
+    sqlite3_reset(statement);
+    if (result != SQLITE_DONE)
+      return Status(result);
+    for (const std::int64_t doomed : ids) {
+      if (doomed <= kRootCount)
+        continue;
+      for (const char* sql : {"DELETE FROM %s.vals WHERE key = ?1", "DELETE FROM %s.keys WHERE id = ?1"}) {
+        std::string text = sql;
+        text.replace(text.find("%s"), 2, Schema(doomed));
+        sqlite3_stmt* deletion = connection.Statement(text);
+        if (deletion == nullptr)
+          return KRERROR_ACCESS_DENIED;
+        sqlite3_bind_int64(deletion, 1, doomed);
+        result = sqlite3_step(deletion);
+        sqlite3_reset(deletion);
+        if (result != SQLITE_DONE)
+          return Status(result);
+      }
     }
-  }
-  return transaction.Commit();
+    return transaction->Commit();
+  });
 }
 
 long SKRRegistryStore::CloseKey(HKEY key) {

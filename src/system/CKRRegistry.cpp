@@ -4,6 +4,7 @@
 
 #include <cstring>
 #include <string>
+#include <type_traits>
 
 namespace {
 
@@ -45,6 +46,12 @@ CKRString Decode(std::u16string_view units) {
   std::wstring text;
   SKRUtf16::Decode(units, text);
   return CKRString(std::move(text));
+}
+
+// A stored text: up to its first null, or all of it when it has none.
+CKRString DecodeText(const std::string& bytes) {
+  const std::u16string units = Units(bytes);
+  return Decode(std::u16string_view(units).substr(0, units.find(u'\0')));
 }
 
 // Appends the UTF-16 form of `text` and a null unit, as little-endian bytes.
@@ -112,6 +119,18 @@ bool ValueNames(HKEY key, std::vector<CKRString>& names) {
   }
 }
 
+// Sets `value` to the default, then to the stored 32 bits (sign-extended for
+// signed types) when `get` reads them.
+template <class T, class Get>
+_EKRRegistryErrors ReadNumber(T& value, T defaultValue, Get get) {
+  value = defaultValue;
+  std::uint32_t number = 0;
+  const _EKRRegistryErrors result = get(number);
+  if (result == KRREGISTRY_SUCCESS)
+    value = std::is_signed_v<T> ? T(std::int32_t(number)) : T(number);
+  return result;
+}
+
 }  // namespace
 
 CKRRegistry::CKRRegistry(const wchar_t* company, const wchar_t* application, HKEY root) {
@@ -163,22 +182,35 @@ _EKRRegistryErrors CKRRegistry::OpenSection(const wchar_t* section, HKEY key, HK
   return KRREGISTRY_SUCCESS;
 }
 
-_EKRRegistryErrors CKRRegistry::GetNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t& number,
-                                          HKEY key) {
+_EKRRegistryErrors CKRRegistry::ReadEntry(const wchar_t* section, const wchar_t* entry, HKEY key,
+                                          std::uint32_t type, std::string& bytes) const {
   HKEY opened = nullptr;
   const _EKRRegistryErrors result = OpenSection(section, key, opened);
   if (result != KRREGISTRY_SUCCESS)
     return result;
   CKRKeyCloser closer(opened);
-  std::uint32_t values = 0;
-  if (KRRegQueryInfoKey(opened, nullptr, nullptr, &values, nullptr, nullptr) != KRERROR_SUCCESS || values == 0)
+  std::uint32_t stored = 0;
+  if (ReadValue(opened, entry, stored, bytes) != KRERROR_SUCCESS)
     return KRREGISTRY_FAILED;
-  std::uint32_t type = 0;
+  return stored == type ? KRREGISTRY_SUCCESS : KRREGISTRY_WRONG_TYPE;
+}
+
+_EKRRegistryErrors CKRRegistry::WriteEntry(const wchar_t* section, const wchar_t* entry, HKEY key,
+                                           std::uint32_t type, const std::string& bytes) const {
+  HKEY opened = nullptr;
+  const _EKRRegistryErrors result = OpenSection(section, key, opened);
+  if (result != KRREGISTRY_SUCCESS)
+    return result;
+  CKRKeyCloser closer(opened);
+  return WriteBytes(opened, entry, type, bytes) == KRERROR_SUCCESS ? KRREGISTRY_SUCCESS : KRREGISTRY_FAILED;
+}
+
+_EKRRegistryErrors CKRRegistry::GetNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t& number,
+                                          HKEY key) const {
   std::string bytes;
-  if (ReadValue(opened, entry, type, bytes) != KRERROR_SUCCESS)
-    return KRREGISTRY_FAILED;
-  if (type != KRREG_DWORD)
-    return KRREGISTRY_WRONG_TYPE;
+  const _EKRRegistryErrors result = ReadEntry(section, entry, key, KRREG_DWORD, bytes);
+  if (result != KRREGISTRY_SUCCESS)
+    return result;
   if (bytes.size() != 4)
     return KRREGISTRY_FAILED;
   number = std::uint32_t(std::uint8_t(bytes[0])) | std::uint32_t(std::uint8_t(bytes[1])) << 8 |
@@ -187,46 +219,24 @@ _EKRRegistryErrors CKRRegistry::GetNumber(const wchar_t* section, const wchar_t*
 }
 
 _EKRRegistryErrors CKRRegistry::PutNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t number,
-                                          HKEY key) {
-  HKEY opened = nullptr;
-  const _EKRRegistryErrors result = OpenSection(section, key, opened);
-  if (result != KRREGISTRY_SUCCESS)
-    return result;
-  CKRKeyCloser closer(opened);
-  const std::uint8_t bytes[4] = {std::uint8_t(number), std::uint8_t(number >> 8), std::uint8_t(number >> 16),
-                                 std::uint8_t(number >> 24)};
-  return KRRegSetValueEx(opened, entry, KRREG_DWORD, bytes, 4) == KRERROR_SUCCESS ? KRREGISTRY_SUCCESS
-                                                                                   : KRREGISTRY_FAILED;
+                                          HKEY key) const {
+  const char bytes[4] = {char(number), char(number >> 8), char(number >> 16), char(number >> 24)};
+  return WriteEntry(section, entry, key, KRREG_DWORD, std::string(bytes, 4));
 }
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry, int& value,
                                             int defaultValue, HKEY key) {
-  value = defaultValue;
-  std::uint32_t number = 0;
-  const _EKRRegistryErrors result = GetNumber(section, entry, number, key);
-  if (result == KRREGISTRY_SUCCESS)
-    value = std::int32_t(number);
-  return result;
+  return ReadNumber(value, defaultValue, [&](std::uint32_t& number) { return GetNumber(section, entry, number, key); });
 }
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry, long& value,
                                             long defaultValue, HKEY key) {
-  value = defaultValue;
-  std::uint32_t number = 0;
-  const _EKRRegistryErrors result = GetNumber(section, entry, number, key);
-  if (result == KRREGISTRY_SUCCESS)
-    value = std::int32_t(number);
-  return result;
+  return ReadNumber(value, defaultValue, [&](std::uint32_t& number) { return GetNumber(section, entry, number, key); });
 }
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry, unsigned long& value,
                                             unsigned long defaultValue, HKEY key) {
-  value = defaultValue;
-  std::uint32_t number = 0;
-  const _EKRRegistryErrors result = GetNumber(section, entry, number, key);
-  if (result == KRREGISTRY_SUCCESS)
-    value = number;
-  return result;
+  return ReadNumber(value, defaultValue, [&](std::uint32_t& number) { return GetNumber(section, entry, number, key); });
 }
 
 _EKRRegistryErrors CKRRegistry::PutRegValue(const wchar_t* section, const wchar_t* entry, int value, HKEY key) {
@@ -250,50 +260,29 @@ _EKRRegistryErrors CKRRegistry::PutRegValue(const wchar_t* section, const wchar_
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry, CKRString& value,
                                             const CKRString& defaultValue, HKEY key) {
   value = defaultValue;
-  HKEY opened = nullptr;
-  const _EKRRegistryErrors result = OpenSection(section, key, opened);
-  if (result != KRREGISTRY_SUCCESS)
-    return result;
-  CKRKeyCloser closer(opened);
-  std::uint32_t type = 0;
   std::string bytes;
-  if (ReadValue(opened, entry, type, bytes) != KRERROR_SUCCESS)
-    return KRREGISTRY_FAILED;
-  if (type != KRREG_SZ)
-    return KRREGISTRY_WRONG_TYPE;
-  const std::u16string units = Units(bytes);
-  value = Decode(std::u16string_view(units).substr(0, units.find(u'\0')));
-  return KRREGISTRY_SUCCESS;
+  const _EKRRegistryErrors result = ReadEntry(section, entry, key, KRREG_SZ, bytes);
+  if (result == KRREGISTRY_SUCCESS)
+    value = DecodeText(bytes);
+  return result;
 }
 
 _EKRRegistryErrors CKRRegistry::PutRegValue(const wchar_t* section, const wchar_t* entry, const CKRString& value,
                                             HKEY key) {
   if (HasNull(value))
     return KRREGISTRY_FAILED;
-  HKEY opened = nullptr;
-  const _EKRRegistryErrors result = OpenSection(section, key, opened);
-  if (result != KRREGISTRY_SUCCESS)
-    return result;
-  CKRKeyCloser closer(opened);
   std::string bytes;
   AppendEncoded(value, bytes);
-  return WriteBytes(opened, entry, KRREG_SZ, bytes) == KRERROR_SUCCESS ? KRREGISTRY_SUCCESS : KRREGISTRY_FAILED;
+  return WriteEntry(section, entry, key, KRREG_SZ, bytes);
 }
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry,
                                             std::vector<CKRString>& value, HKEY key) {
   value.clear();
-  HKEY opened = nullptr;
-  const _EKRRegistryErrors result = OpenSection(section, key, opened);
+  std::string bytes;
+  const _EKRRegistryErrors result = ReadEntry(section, entry, key, KRREG_MULTI_SZ, bytes);
   if (result != KRREGISTRY_SUCCESS)
     return result;
-  CKRKeyCloser closer(opened);
-  std::uint32_t type = 0;
-  std::string bytes;
-  if (ReadValue(opened, entry, type, bytes) != KRERROR_SUCCESS)
-    return KRREGISTRY_FAILED;
-  if (type != KRREG_MULTI_SZ)
-    return KRREGISTRY_WRONG_TYPE;
   // Strings up to the empty one that ends the list; a last string without
   // its null still counts.
   const std::u16string units = Units(bytes);
@@ -312,22 +301,16 @@ _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_
 _EKRRegistryErrors CKRRegistry::PutRegValue(const wchar_t* section, const wchar_t* entry,
                                             const std::vector<CKRString>& value, HKEY key) {
   // An empty string, or one with a null, would end the list early on reading.
-  for (const CKRString& text : value)
+  std::string bytes;
+  for (const CKRString& text : value) {
     if (text.IsEmpty() || HasNull(text))
       return KRREGISTRY_FAILED;
-  HKEY opened = nullptr;
-  const _EKRRegistryErrors result = OpenSection(section, key, opened);
-  if (result != KRREGISTRY_SUCCESS)
-    return result;
-  CKRKeyCloser closer(opened);
-  std::string bytes;
-  for (const CKRString& text : value)
     AppendEncoded(text, bytes);
+  }
   bytes.append(2, '\0');
   if (bytes.size() > kMaxValueSize)
     return KRREGISTRY_FAILED;
-  return WriteBytes(opened, entry, KRREG_MULTI_SZ, bytes) == KRERROR_SUCCESS ? KRREGISTRY_SUCCESS
-                                                                              : KRREGISTRY_FAILED;
+  return WriteEntry(section, entry, key, KRREG_MULTI_SZ, bytes);
 }
 
 _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry,
@@ -352,8 +335,7 @@ _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_
     if (!ParseBracedGuid(name.GetString(), name.size(), guid) ||
         ReadValue(map, name.GetString(), type, bytes) != KRERROR_SUCCESS || type != KRREG_SZ)
       continue;
-    const std::u16string units = Units(bytes);
-    value[guid] = Decode(std::u16string_view(units).substr(0, units.find(u'\0')));
+    value[guid] = DecodeText(bytes);
   }
   return KRREGISTRY_SUCCESS;
 }

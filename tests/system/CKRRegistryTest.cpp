@@ -225,9 +225,8 @@ TEST_F(CKRRegistryFixture, ExportWritesRegedit4ByteForByte) {
       "\r\n[HKEY_CURRENT_USER\\Software\\A\\b\\C]\r\n"
       "\"multi\"=hex(7):78,00,00,00,00,00\r\n"
       "\r\n[HKEY_CURRENT_USER\\Software\\A\\?B]\r\n";
-  const std::string file = m_Scratch.Native("out.reg");
-  ASSERT_TRUE(CKRRegistry::WriteRegistryTreeToFile(HKEY_CURRENT_USER, L"Software\\A", m_Scratch.Wide("out.reg")
-                                                                                          .GetString()));
+  ASSERT_TRUE(
+      CKRRegistry::WriteRegistryTreeToFile(HKEY_CURRENT_USER, L"Software\\A", m_Scratch.Wide("out.reg").GetString()));
   EXPECT_EQ(KRLoadText(m_Scratch.Wide("out.reg")), expected);
   ASSERT_TRUE(CKRRegistry::WriteRegistryTreeToFile(L"HKCU\\Software\\A", m_Scratch.Wide("short.reg").GetString()));
   EXPECT_EQ(KRLoadText(m_Scratch.Wide("short.reg")), expected);
@@ -252,8 +251,8 @@ TEST_F(CKRRegistryFixture, ExportFailuresLeaveNoFile) {
   EXPECT_FALSE(CKRRegistry::WriteRegistryTreeToFile(nullptr, L"Software", keep.GetString()));
   EXPECT_FALSE(CKRRegistry::WriteRegistryTreeToFile(HKEY_CURRENT_USER, L"", keep.GetString()));
   EXPECT_FALSE(CKRRegistry::WriteRegistryTreeToFile(HKEY_CURRENT_USER, L"SOFTWARE", L""));
-  EXPECT_FALSE(
-      CKRRegistry::WriteRegistryTreeToFile(HKEY_CURRENT_USER, L"SOFTWARE", m_Scratch.Wide("no/folder.reg").GetString()));
+  const CKRString nowhere = m_Scratch.Wide("no/folder.reg");
+  EXPECT_FALSE(CKRRegistry::WriteRegistryTreeToFile(HKEY_CURRENT_USER, L"SOFTWARE", nowhere.GetString()));
   // Nothing but the kept file is left in the folder (no temporary files).
   std::vector<std::string> names;
   for (const auto& entry : std::filesystem::directory_iterator(m_Scratch.Native()))

@@ -6,6 +6,9 @@
 
 #include "KRFilesScratch.h"
 
+#include <sqlite3.h>
+
+#include <chrono>
 #include <csignal>
 #include <optional>
 
@@ -13,7 +16,8 @@ namespace {
 
 class CKRRegistryScratch : public ::testing::Test {
 protected:
-  void SetUp() override { ::setenv("KR_REGISTRY_DIR", m_Scratch.Native().c_str(), 1); }
+  // The store makes its folder itself.
+  void SetUp() override { ::setenv("KR_REGISTRY_DIR", Path("").c_str(), 1); }
   void TearDown() override { ::unsetenv("KR_REGISTRY_DIR"); }
 
   HKEY Create(const wchar_t* path, std::uint32_t options = KRREG_OPTION_NON_VOLATILE) {
@@ -21,7 +25,7 @@ protected:
     EXPECT_EQ(KRRegCreateKeyEx(HKEY_CURRENT_USER, path, options, KRKEY_ALL_ACCESS, &key, nullptr), KRERROR_SUCCESS);
     return key;
   }
-  std::string Path(const char* name) const { return m_Scratch.Native(name); }
+  std::string Path(const std::string& name) const { return m_Scratch.Native(name.empty() ? "reg" : "reg/" + name); }
 
   CKRFilesScratch m_Scratch;
 };
@@ -228,12 +232,14 @@ TEST_F(CKRRegistryScratch, HandlesAndSubtrees) {
   for (HKEY open : {top, reader, again, other})
     EXPECT_EQ(KRRegCloseKey(open), 0);
 
-  // Files and folder are the owner's alone.
+  // Files (with their logs) and folder are the owner's alone.
   struct stat info {};
-  ASSERT_EQ(::stat(Path("registry.db").c_str(), &info), 0);
-  EXPECT_EQ(info.st_mode & 0777, 0600u);
-  ASSERT_EQ(::stat(Path("krCoreLib-volatile-registry.db").c_str(), &info), 0);
-  EXPECT_EQ(info.st_mode & 0777, 0600u);
+  for (const char* name : {"registry.db", "registry.db-wal", "registry.db-shm", "krCoreLib-volatile-registry.db"}) {
+    ASSERT_EQ(::stat(Path(name).c_str(), &info), 0) << name;
+    EXPECT_EQ(info.st_mode & 0777, 0600u) << name;
+  }
+  ASSERT_EQ(::stat(Path("").c_str(), &info), 0);
+  EXPECT_EQ(info.st_mode & 0777, 0700u);
 }
 
 TEST(KRRegistryAPI, DISABLED_WriteInChild) {
@@ -344,7 +350,8 @@ TEST_F(CKRRegistryScratch, KilledWriterLeavesEveryCommittedValue) {
 }
 
 TEST_F(CKRRegistryScratch, DamagedOrExposedStoreGivesErrors) {
-  m_Scratch.WriteFile("registry.db", std::string(8192, 'G'));
+  ASSERT_EQ(::mkdir(Path("").c_str(), 0700), 0);
+  m_Scratch.WriteFile("reg/registry.db", std::string(8192, 'G'));
   ::chmod(Path("registry.db").c_str(), 0600);
   HKEY key = nullptr;
   EXPECT_EQ(KRRegCreateKeyEx(HKEY_CURRENT_USER, L"Software", 0, KRKEY_ALL_ACCESS, &key, nullptr),
@@ -363,10 +370,28 @@ TEST_F(CKRRegistryScratch, DamagedOrExposedStoreGivesErrors) {
   ::setenv("KR_REGISTRY_DIR", Path("elsewhere").c_str(), 1);
   key = Create(L"Software");
   EXPECT_EQ(KRRegCloseKey(key), 0);
-  ::setenv("KR_REGISTRY_DIR", m_Scratch.Native().c_str(), 1);
+  ::setenv("KR_REGISTRY_DIR", Path("").c_str(), 1);
   EXPECT_EQ(KRRegCreateKeyEx(HKEY_CURRENT_USER, L"Software", 0, KRKEY_ALL_ACCESS, &key, nullptr),
             KRERROR_ACCESS_DENIED);
   ::chmod(Path("elsewhere").c_str(), 0755);
   ::setenv("KR_REGISTRY_DIR", Path("elsewhere").c_str(), 1);
   EXPECT_EQ(KRRegQueryValueEx(HKEY_CURRENT_USER, L"v", nullptr, nullptr, &size), KRERROR_ACCESS_DENIED);
+}
+
+TEST_F(CKRRegistryScratch, WriterLockedOutGivesUpButReadsGoOn) {
+  HKEY key = Create(L"Software\\Locked");
+  ASSERT_EQ(Put(key, L"v", KRREG_SZ, "before"), 0);
+  // Another writer holds the store's write lock past the bounded wait.
+  sqlite3* other = nullptr;
+  ASSERT_EQ(sqlite3_open(Path("registry.db").c_str(), &other), SQLITE_OK);
+  ASSERT_EQ(sqlite3_exec(other, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr), SQLITE_OK);
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_EQ(Put(key, L"v", KRREG_SZ, "during"), KRERROR_ACCESS_DENIED);
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(60)) << "bounded, not a hang";
+  EXPECT_EQ(Get(key, L"v"), "before");
+  sqlite3_exec(other, "ROLLBACK", nullptr, nullptr, nullptr);
+  sqlite3_close(other);
+  EXPECT_EQ(Put(key, L"v", KRREG_SZ, "after"), 0);
+  EXPECT_EQ(Get(key, L"v"), "after");
+  EXPECT_EQ(KRRegCloseKey(key), 0);
 }

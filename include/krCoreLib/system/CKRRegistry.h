@@ -35,6 +35,7 @@
 
 #include <cstdint>
 #include <map>
+#include <string>
 #include <vector>
 
 // The result of every CKRRegistry operation.
@@ -111,8 +112,9 @@ public:
   // Writes the tree below root\subkey to `file` as REGEDIT4 text (8-bit,
   // lines ending in CR LF). The file is written under a temporary name in
   // its folder and renamed over `file` only when everything was written: on
-  // any failure (a key or value unreadable, a short write, nesting beyond
-  // kMaxExportDepth) it returns false and `file` is as it was. Forms:
+  // any failure (a key or value unreadable or larger than kMaxValueSize, a
+  // short write, nesting beyond kMaxExportDepth) it returns false and `file`
+  // is as it was. Forms:
   // - a text (type 1) whose characters all lie below U+0100 as the quoted
   //   text: '"' and '\' escaped with '\', characters 0x20 to 0x7E and 0xA0
   //   to 0xFF as themselves, others as '\' and two hex digits; a text with
@@ -135,8 +137,13 @@ public:
 private:
   // The section key below the base key (all access), or the reason why not.
   _EKRRegistryErrors OpenSection(const wchar_t* section, HKEY key, HKEY& opened) const;
-  _EKRRegistryErrors GetNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t& number, HKEY key);
-  _EKRRegistryErrors PutNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t number, HKEY key);
+  // The bytes of a value of the given type in the section; wrong type: 7.
+  _EKRRegistryErrors ReadEntry(const wchar_t* section, const wchar_t* entry, HKEY key, std::uint32_t type,
+                               std::string& bytes) const;
+  _EKRRegistryErrors WriteEntry(const wchar_t* section, const wchar_t* entry, HKEY key, std::uint32_t type,
+                                const std::string& bytes) const;
+  _EKRRegistryErrors GetNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t& number, HKEY key) const;
+  _EKRRegistryErrors PutNumber(const wchar_t* section, const wchar_t* entry, std::uint32_t number, HKEY key) const;
   void CloseKeys() noexcept;
 
   _EKRRegistryErrors m_eState = KRREGISTRY_NOT_INITIALIZED;
