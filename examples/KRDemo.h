@@ -27,3 +27,4 @@ void KRDemoFiles();
 void KRDemoThreads();
 void KRDemoPlugins();
 void KRDemoStorage();
+void KRDemoRegistry();

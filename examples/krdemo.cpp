@@ -14,6 +14,8 @@ int main() {
   KRDemoTools();
   PrintSection(L"XML storage: a graph and preferences in one file");
   KRDemoStorage();
+  PrintSection(L"Registry storage");
+  KRDemoRegistry();
   PrintSection(L"Units and engineering values");
   KRDemoUnits();
   PrintSection(L"Math in two precisions");

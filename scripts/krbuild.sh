@@ -15,7 +15,7 @@ root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 
 # What the library and the demo need; the tests and the benchmarks (built
 # with the tests, run by hand) need the rest.
-packages=(g++ cmake ninja-build pkg-config libxerces-c-dev)
+packages=(g++ cmake ninja-build pkg-config libxerces-c-dev libsqlite3-dev)
 if [[ $mode != demo ]]; then
   packages+=(libgtest-dev libgmock-dev locales libbenchmark-dev uuid-dev libeigen3-dev libudunits2-dev libcgal-dev libcereal-dev libboost-serialization-dev)
 fi

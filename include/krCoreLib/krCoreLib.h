@@ -10,6 +10,7 @@
 #include <krCoreLib/platform/KRGuidDef.h>
 #include <krCoreLib/platform/KRCmdTarget.h>
 #include <krCoreLib/platform/KRMenu.h>
+#include <krCoreLib/platform/KRRegistryAPI.h>
 
 #include <krCoreLib/objectmodel/CKRGuid.h>
 #include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
@@ -50,6 +51,10 @@
 #include <krCoreLib/storage/xml/CKRXMLFileDocument.h>
 #include <krCoreLib/storage/xml/CKRXMLFileFieldStream.h>
 #include <krCoreLib/storage/xml/CKRXMLFileTypeManifest.h>
+#include <krCoreLib/storage/registry/CKRRegistryFieldStream.h>
+#include <krCoreLib/storage/registry/CKRRegistrySerializer.h>
+#include <krCoreLib/storage/registry/CKRRegistryTypeManifest.h>
+#include <krCoreLib/storage/registry/KRRegistryValues.h>
 #include <krCoreLib/platform/KRFileChooser.h>
 
 // Application framework.
@@ -123,6 +128,7 @@
 // System services.
 #include <krCoreLib/system/CKRMemMapFile.h>
 #include <krCoreLib/system/CKRPathHelper.h>
+#include <krCoreLib/system/CKRRegistry.h>
 #include <krCoreLib/system/CKRSingleAppInstance.h>
 #include <krCoreLib/system/CKRSystem.h>
 #include <krCoreLib/system/CKRProgressTaskThread.h>

@@ -14,6 +14,22 @@
 // used by one thread at a time; different handles may be used by different
 // threads and processes at once: every change is one atomic, durable
 // transaction.
+//
+// Where it lives: one store per user, $XDG_CONFIG_HOME/krCoreLib/registry.db
+// (~/.config when $XDG_CONFIG_HOME is not set), and the volatile keys in
+// krCoreLib-volatile-registry.db in the user's runtime folder
+// ($XDG_RUNTIME_DIR, else a private folder in /tmp); both in the folder
+// $KR_REGISTRY_DIR instead when that is set. Folders are made mode 0700 and
+// files 0600; a folder or file that others may use is refused.
+//
+// Failures: a store that cannot be opened, is not a database, is damaged,
+// or stays locked by another writer for more than 5 seconds gives
+// KRERROR_ACCESS_DENIED, as does a change through a handle opened with read
+// access only. A handle that was never returned, is already closed, or
+// refers to a key deleted since (or to a volatile key whose store was
+// cleared) gives KRERROR_INVALID_HANDLE; closing it still succeeds for a
+// handle of a deleted key. A forked child must not use the registry before
+// it execs (the store's connection cannot be carried across fork).
 #pragma once
 
 #include <krCoreLib/core/KRExport.h>
@@ -37,8 +53,15 @@ constexpr long KRERROR_SUCCESS = 0;
 constexpr long KRERROR_FILE_NOT_FOUND = 2;
 constexpr long KRERROR_ACCESS_DENIED = 5;
 constexpr long KRERROR_INVALID_HANDLE = 6;
+// A name or size out of bounds: an empty part of a key path, a key name of
+// 255 or more characters, a value name of more than 16383 characters, a
+// value of more than 1 MiB, or a null buffer with a non-zero size.
+constexpr long KRERROR_INVALID_PARAMETER = 87;
 constexpr long KRERROR_MORE_DATA = 234;
 constexpr long KRERROR_NO_MORE_ITEMS = 259;
+// A key created without the volatile option below a volatile key (which
+// could not outlive its parent).
+constexpr long KRERROR_CHILD_MUST_BE_VOLATILE = 1021;
 
 // Value types. Any other type number is stored and returned as bytes.
 constexpr std::uint32_t KRREG_NONE = 0;
@@ -53,7 +76,10 @@ constexpr std::uint32_t KRREG_MULTI_SZ = 7;
 constexpr std::uint32_t KRREG_OPTION_NON_VOLATILE = 0;
 constexpr std::uint32_t KRREG_OPTION_VOLATILE = 1;
 
-// Access masks: read access lets a handle query and enumerate only.
+// Access masks: a handle opened with read access queries and enumerates,
+// and cannot set or delete values of its key. Opening, creating and
+// deleting keys below a handle work through any handle (the desktop
+// registry checks those against the keys, not the handle).
 constexpr std::uint32_t KRKEY_READ = 0x20019;
 constexpr std::uint32_t KRKEY_ALL_ACCESS = 0xF003F;
 
