@@ -4,6 +4,8 @@
 #include <krCoreLib/serialization/IKRField.h>
 #include <krCoreLib/serialization/IKRFieldStream.h>
 
+#include "KRBlockPool.h"
+
 int CKRFieldDataAdaptor::FlagsOfField() {
   IKRField* field = GetField();
   return field != nullptr ? field->GetFlags() : 0;
@@ -58,7 +60,7 @@ void CKRFieldDataAdaptor::SetParentField(IKRFieldData* parent) {
   m_pParentField = parent;
 }
 
-int CKRFieldDataAdaptor::SetValueFromString(CKRString) {
+int CKRFieldDataAdaptor::SetValueFromString(const CKRString&) {
   return 0;
 }
 
@@ -122,4 +124,20 @@ int CKRFieldDataAdaptor::Checked() {
   if (HasCheckbox() == 0 || m_pOriginObject == nullptr)
     return 0;
   return m_pOriginObject->IsFieldChecked(this);
+}
+
+void* CKRFieldDataAdaptor::operator new(std::size_t size) {
+  return KRPoolAllocate(size);
+}
+
+void* CKRFieldDataAdaptor::operator new(std::size_t size, std::align_val_t alignment) {
+  return ::operator new(size, alignment);
+}
+
+void CKRFieldDataAdaptor::operator delete(void* block, std::size_t size) noexcept {
+  KRPoolFree(block, size);
+}
+
+void CKRFieldDataAdaptor::operator delete(void* block, std::size_t size, std::align_val_t alignment) noexcept {
+  ::operator delete(block, size, alignment);
 }

@@ -1,5 +1,7 @@
 #include <krCoreLib/serialization/CKRFieldStream.h>
 
+#include "KRBlockPool.h"
+
 KR_IMPLEMENT_ABSTRACT_OBJECT_TYPE(CKRFieldStream, CKRObjectImpl)
 
 void* CKRFieldStream::GetInterface(CKRGuid iid) {
@@ -69,4 +71,20 @@ IKRObject* CKRFieldStream::GetResult() {
 
 void CKRFieldStream::SetResult(IKRObject* object) {
   m_pResult = object;
+}
+
+void* CKRFieldStream::operator new(std::size_t size) {
+  return KRPoolAllocate(size);
+}
+
+void* CKRFieldStream::operator new(std::size_t size, std::align_val_t alignment) {
+  return ::operator new(size, alignment);
+}
+
+void CKRFieldStream::operator delete(void* block, std::size_t size) noexcept {
+  KRPoolFree(block, size);
+}
+
+void CKRFieldStream::operator delete(void* block, std::size_t size, std::align_val_t alignment) noexcept {
+  ::operator delete(block, size, alignment);
 }
