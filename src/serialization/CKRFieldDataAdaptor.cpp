@@ -126,18 +126,4 @@ int CKRFieldDataAdaptor::Checked() {
   return m_pOriginObject->IsFieldChecked(this);
 }
 
-void* CKRFieldDataAdaptor::operator new(std::size_t size) {
-  return KRPoolAllocate(size);
-}
-
-void* CKRFieldDataAdaptor::operator new(std::size_t size, std::align_val_t alignment) {
-  return ::operator new(size, alignment);
-}
-
-void CKRFieldDataAdaptor::operator delete(void* block, std::size_t size) noexcept {
-  KRPoolFree(block, size);
-}
-
-void CKRFieldDataAdaptor::operator delete(void* block, std::size_t size, std::align_val_t alignment) noexcept {
-  ::operator delete(block, size, alignment);
-}
+KR_IMPLEMENT_POOLED_ALLOCATION(CKRFieldDataAdaptor)

@@ -73,18 +73,4 @@ void CKRFieldStream::SetResult(IKRObject* object) {
   m_pResult = object;
 }
 
-void* CKRFieldStream::operator new(std::size_t size) {
-  return KRPoolAllocate(size);
-}
-
-void* CKRFieldStream::operator new(std::size_t size, std::align_val_t alignment) {
-  return ::operator new(size, alignment);
-}
-
-void CKRFieldStream::operator delete(void* block, std::size_t size) noexcept {
-  KRPoolFree(block, size);
-}
-
-void CKRFieldStream::operator delete(void* block, std::size_t size, std::align_val_t alignment) noexcept {
-  ::operator delete(block, size, alignment);
-}
+KR_IMPLEMENT_POOLED_ALLOCATION(CKRFieldStream)

@@ -12,8 +12,21 @@
 #pragma once
 
 #include <cstddef>
+#include <new>
 
 inline constexpr std::size_t kMaxPooledBlock = 256;
 
 void* KRPoolAllocate(std::size_t size);
 void KRPoolFree(void* block, std::size_t size) noexcept;
+
+// Defines the class-specific operator new and delete that a class declares
+// (the plain and the over-aligned pair; over-aligned objects are not pooled).
+#define KR_IMPLEMENT_POOLED_ALLOCATION(Class)                                                  \
+  void* Class::operator new(std::size_t size) { return KRPoolAllocate(size); }                 \
+  void* Class::operator new(std::size_t size, std::align_val_t alignment) {                    \
+    return ::operator new(size, alignment);                                                    \
+  }                                                                                            \
+  void Class::operator delete(void* block, std::size_t size) noexcept { KRPoolFree(block, size); } \
+  void Class::operator delete(void* block, std::size_t size, std::align_val_t alignment) noexcept { \
+    ::operator delete(block, size, alignment);                                                 \
+  }
