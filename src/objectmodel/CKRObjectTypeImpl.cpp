@@ -4,7 +4,7 @@
 #include <krCoreLib/objectmodel/CKRTypeSystem.h>
 #include <krCoreLib/objectmodel/IKRObject.h>
 
-#include <krCoreLib/objectmodel/SKRGuidTableT.h>
+#include "KRTrackedInstances.h"
 
 #include <algorithm>
 
@@ -16,10 +16,10 @@ constexpr int kMaxHierarchyDepth = 4096;
 
 }  // namespace
 
-CKRObjectTypeImpl::CKRObjectTypeImpl() : m_pInstances(std::make_unique<SKRGuidTableT<IKRObject>>()) {}
+CKRObjectTypeImpl::CKRObjectTypeImpl() : m_pInstances(std::make_unique<SKRTrackedInstances>()) {}
 
 int CKRObjectTypeImpl::GetInstanceCount() const {
-  return static_cast<int>(m_pInstances->Size());
+  return static_cast<int>(m_pInstances->Table().Size());
 }
 
 CKRObjectTypeImpl::~CKRObjectTypeImpl() {
@@ -101,8 +101,8 @@ void CKRObjectTypeImpl::Release() {
     std::vector<CKRGuid> ids;
     GetInstanceList(ids);
     for (const CKRGuid& id : ids)
-      if (IKRObject* object = m_pInstances->Find(id)) {
-        m_pInstances->Remove(id, object);
+      if (IKRObject* object = m_pInstances->Table().Find(id)) {
+        m_pInstances->Table().Remove(id, object);
         object->Release();
       }
   }
@@ -163,7 +163,7 @@ int CKRObjectTypeImpl::ReleaseInstance(IKRObject* object) {
 }
 
 IKRObject* CKRObjectTypeImpl::GetInstance(CKRGuid instanceID) {
-  return m_pInstances->Find(instanceID);
+  return m_pInstances->Table().Find(instanceID);
 }
 
 int CKRObjectTypeImpl::AddChildType(IKRObjectType* child) {
@@ -196,7 +196,7 @@ int CKRObjectTypeImpl::IsTypeOf(CKRGuid typeID) {
 
 void CKRObjectTypeImpl::GetInstanceList(std::vector<CKRGuid>& list) {
   const std::size_t first = list.size();
-  m_pInstances->ForEach([&](const CKRGuid& id, IKRObject*) { list.push_back(id); });
+  m_pInstances->Table().ForEach([&](const CKRGuid& id, IKRObject*) { list.push_back(id); });
   std::sort(list.begin() + std::ptrdiff_t(first), list.end());
 }
 

@@ -4,6 +4,8 @@
 #include <krCoreLib/serialization/IKRField.h>
 #include <krCoreLib/serialization/IKRFieldStream.h>
 
+#include "KRBlockPool.h"
+
 int CKRFieldDataAdaptor::FlagsOfField() {
   IKRField* field = GetField();
   return field != nullptr ? field->GetFlags() : 0;
@@ -58,7 +60,7 @@ void CKRFieldDataAdaptor::SetParentField(IKRFieldData* parent) {
   m_pParentField = parent;
 }
 
-int CKRFieldDataAdaptor::SetValueFromString(CKRString) {
+int CKRFieldDataAdaptor::SetValueFromString(const CKRString&) {
   return 0;
 }
 
@@ -123,3 +125,5 @@ int CKRFieldDataAdaptor::Checked() {
     return 0;
   return m_pOriginObject->IsFieldChecked(this);
 }
+
+KR_IMPLEMENT_POOLED_ALLOCATION(CKRFieldDataAdaptor)

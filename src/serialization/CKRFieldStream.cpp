@@ -1,5 +1,7 @@
 #include <krCoreLib/serialization/CKRFieldStream.h>
 
+#include "KRBlockPool.h"
+
 KR_IMPLEMENT_ABSTRACT_OBJECT_TYPE(CKRFieldStream, CKRObjectImpl)
 
 void* CKRFieldStream::GetInterface(CKRGuid iid) {
@@ -70,3 +72,5 @@ IKRObject* CKRFieldStream::GetResult() {
 void CKRFieldStream::SetResult(IKRObject* object) {
   m_pResult = object;
 }
+
+KR_IMPLEMENT_POOLED_ALLOCATION(CKRFieldStream)

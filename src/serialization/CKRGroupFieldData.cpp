@@ -59,13 +59,14 @@ void CKRGroupFieldData::Release(bool deep) {
   delete this;
 }
 
-int CKRGroupFieldData::SetValueFromString(CKRString text) {
-  text.Trim();
-  if (text.IsEmpty())
+int CKRGroupFieldData::SetValueFromString(const CKRString& text) {
+  CKRString trimmed = text;
+  trimmed.Trim();
+  if (trimmed.IsEmpty())
     return 1;
   int all = 1;
   for (IKRFieldData* member : m_Members)
-    if (member->SetValueFromString(text) == 0)
+    if (member->SetValueFromString(trimmed) == 0)
       all = 0;
   return all;
 }

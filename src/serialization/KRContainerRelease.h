@@ -4,6 +4,7 @@
 
 #include <krCoreLib/objectmodel/CKRObjGuidPtrMap.h>
 
+#include <cstddef>
 #include <utility>
 #include <vector>
 
@@ -30,10 +31,17 @@ int KRReleaseChildren(CKRObjGuidPtrMap<T>& children) {
   children.GetEntries(taken);
   children.RemoveAll(false);
   int result = 1;
-  for (const auto& [id, child] : taken)
+  // The children lie scattered in memory and are visited in ID order: their
+  // first cache lines are prefetched a few releases ahead.
+  constexpr std::size_t kAhead = 8;
+  for (std::size_t i = 0; i < taken.size(); ++i) {
+    if (i + kAhead < taken.size())
+      __builtin_prefetch(taken[i + kAhead].second);
+    T* child = taken[i].second;
     if (child->Release() == 0) {
       children.Add(child);
       result = 0;
     }
+  }
   return result;
 }

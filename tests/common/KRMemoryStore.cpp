@@ -28,29 +28,20 @@ CKRBOOL CKRMemoryArchive::Open(AccessMode mode) {
     CKRDocument* document = CreateNewDocument(documentID, nullptr);
     if (document == nullptr)
       return false;
-    // Manifests by type, streams in ascending ID order within each; each
-    // stream is handed its stored object, so reading needs no look-up.
-    struct SKRInstance {
-      CKRGuid m_TypeID;
-      CKRGuid m_InstanceID;
-      SKRStoredObject* m_pObject;
-    };
-    std::vector<SKRInstance> instances;
-    instances.reserve(stored.m_Objects.size());
+    // One manifest per stored type, then its streams; each stream is handed
+    // its stored object, so reading needs no look-up. (Grouped, not sorted:
+    // the manifest keys its streams by ID whatever the order they come in.)
+    std::map<CKRGuid, std::vector<std::pair<CKRGuid, SKRStoredObject*>>> byType;
     for (auto& [instanceID, object] : stored.m_Objects)
-      instances.push_back({object.m_TypeID, instanceID, &object});
-    std::sort(instances.begin(), instances.end(), [](const SKRInstance& a, const SKRInstance& b) {
-      return a.m_TypeID != b.m_TypeID ? a.m_TypeID < b.m_TypeID : a.m_InstanceID < b.m_InstanceID;
-    });
-    CKRTypeManifest* manifest = nullptr;
-    for (const SKRInstance& instance : instances) {
-      if (manifest == nullptr || manifest->GetStoredTypeID() != instance.m_TypeID) {
-        if ((manifest = document->CreateTypeManifest(instance.m_TypeID, nullptr)) == nullptr)
-          return false;
-        manifest->ReadTypeHeader(CKRTypeSystem::FindType(instance.m_TypeID));
-      }
-      if (auto* stream = dynamic_cast<CKRMemoryFieldStream*>(manifest->CreateFieldStream(instance.m_InstanceID, nullptr)))
-        stream->SetStoredObject(instance.m_pObject);
+      byType[object.m_TypeID].emplace_back(instanceID, &object);
+    for (const auto& [typeID, instances] : byType) {
+      CKRTypeManifest* manifest = document->CreateTypeManifest(typeID, nullptr);
+      if (manifest == nullptr)
+        return false;
+      manifest->ReadTypeHeader(CKRTypeSystem::FindType(typeID));
+      for (const auto& [instanceID, object] : instances)
+        if (auto* stream = dynamic_cast<CKRMemoryFieldStream*>(manifest->CreateFieldStream(instanceID, nullptr)))
+          stream->SetStoredObject(object);
     }
   }
   return true;

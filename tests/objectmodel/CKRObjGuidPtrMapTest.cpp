@@ -65,8 +65,22 @@ TEST(CKRObjGuidPtrMap, WalksAndReleasesInAscendingIDOrder) {
 TEST(CKRObjGuidPtrMap, RandomEditsKeepOrderDuringWalks) {
   std::mt19937 random(KRTestSeed());
   std::vector<CKRTestItem*> pool;
-  for (int i = 0; i < 400; ++i)
+  for (int i = 0; i < 300; ++i)
     pool.push_back(NewTestItem());
+  // Nearly equal IDs: one shared GUID with a few bytes changed (high bytes
+  // included), so that orders decided late in the ID are exercised.
+  const GUID shared = CKRGuid::CreateNewGUID().GetGUID();
+  for (int i = 0; i < 100; ++i) {
+    GUID id = shared;
+    for (int changes = 1 + int(random() % 2); changes > 0; --changes)
+      switch (random() % 4) {
+        case 0: id.Data2 = decltype(id.Data2)(random()); break;
+        case 1: id.Data3 = decltype(id.Data3)(random()); break;
+        default: id.Data4[random() % 8] = (unsigned char)(random()); break;
+      }
+    if (std::none_of(pool.begin(), pool.end(), [&](CKRTestItem* item) { return item->GetInstanceID() == CKRGuid(id); }))
+      pool.push_back(NewTestItem(CKRGuid(id)));
+  }
   CKRObjGuidPtrMap<CKRTestItem> map;
   std::map<CKRGuid, CKRTestItem*> model;
   auto edit = [&] {
@@ -90,6 +104,10 @@ TEST(CKRObjGuidPtrMap, RandomEditsKeepOrderDuringWalks) {
     for (const auto& [id, item] : model)
       expected.push_back(item);
     ASSERT_EQ(walked, expected) << "round " << round;
+    using SEntries = std::vector<std::pair<CKRGuid, CKRTestItem*>>;
+    SEntries entries;
+    map.GetEntries(entries);
+    ASSERT_EQ(entries, SEntries(model.begin(), model.end())) << "round " << round;
     // A walk with edits between its steps returns ascending IDs, each
     // present when it is returned.
     auto it = map.GetIterator();

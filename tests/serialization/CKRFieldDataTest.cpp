@@ -10,6 +10,10 @@
 
 #include <climits>
 #include <memory>
+#include <set>
+#include <string>
+#include <thread>
+#include <vector>
 
 namespace {
 
@@ -70,6 +74,49 @@ TEST(CKRFieldDataT, ValuesAsText) {
   EXPECT_EQ(owned->GetStringValue(), L"heap");
   owned->Release(true);
   EXPECT_EQ(stringField.m_pField->CreateFieldData(nullptr), nullptr);
+}
+
+// Field data are made and released by the hundred thousand; their memory is
+// reused. Made on one thread, released on another, made again after the
+// first thread ended: every live field data has its own memory and stays
+// bound to its own member.
+TEST(CKRFieldDataT, MadeAndReleasedOnSeveralThreads) {
+  constexpr int kCount = 3000;  // more than one slab of blocks
+  SField<CKRString> strings(KRDT_STRING);
+  SField<int> ints(KRDT_INTEGER);
+  std::vector<CKRString> texts(kCount);
+  std::vector<int> numbers(kCount);
+  std::vector<IKRFieldData*> made;
+  auto make = [&](std::vector<IKRFieldData*>& into) {
+    for (int i = 0; i < kCount; ++i) {
+      texts[i] = CKRString(std::to_wstring(i));
+      numbers[i] = i;
+      into.push_back(strings.Bind(&texts[i]));
+      into.push_back(ints.Bind(&numbers[i]));
+    }
+  };
+  auto check = [&](const std::vector<IKRFieldData*>& live) {
+    ASSERT_EQ(std::set<IKRFieldData*>(live.begin(), live.end()).size(), live.size());
+    for (int i = 0; i < kCount; ++i) {
+      ASSERT_EQ(live[2 * i]->GetStringValue(), CKRString(std::to_wstring(i)));
+      ASSERT_EQ(live[2 * i + 1]->GetStringValue(), CKRString(std::to_wstring(i)));
+    }
+  };
+  std::thread([&] { make(made); }).join();
+  check(made);
+  for (IKRFieldData* data : made)
+    data->Release(false);
+  made.clear();
+  std::vector<IKRFieldData*> gone;
+  std::thread([&] {
+    make(gone);
+    for (IKRFieldData* data : gone)
+      data->Release(false);
+  }).join();
+  make(made);
+  check(made);
+  for (IKRFieldData* data : made)
+    data->Release(false);
 }
 
 TEST(CKRFieldDataT, EqualsAndSetToNeedTheSameDataType) {

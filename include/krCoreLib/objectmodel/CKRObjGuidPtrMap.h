@@ -20,6 +20,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
+#include <cstdint>
 #include <iterator>
 #include <type_traits>
 #include <utility>
@@ -154,11 +155,36 @@ public:
   // `entries`. One sequential pass over the hash table and a sort: cheaper
   // than a walk, which looks each ID up again, for taking a whole large map.
   void GetEntries(std::vector<std::pair<CKRGuid, T*>>& entries) const {
-    const std::size_t first = entries.size();
-    entries.reserve(first + m_Index.Size());
-    m_Index.ForEach([&](const CKRGuid& id, T* element) { entries.emplace_back(id, element); });
-    std::sort(entries.begin() + std::ptrdiff_t(first), entries.end(),
-              [](const auto& a, const auto& b) { return a.first < b.first; });
+    // Sorted as two integers per ID that order exactly as CKRGuid does
+    // (Data1, Data2, Data3, then the bytes of Data4 in turn): far cheaper
+    // to compare than the field-by-field order.
+    struct SKRKeyed {
+      std::uint64_t m_High;
+      std::uint64_t m_Low;
+      T* m_pElement;
+    };
+    std::vector<SKRKeyed> keyed;
+    keyed.reserve(m_Index.Size());
+    m_Index.ForEach([&](const CKRGuid& id, T* element) {
+      const GUID& guid = id.GetGUID();
+      std::uint64_t low = 0;
+      for (unsigned char byte : guid.Data4)
+        low = (low << 8) | byte;
+      keyed.push_back({(std::uint64_t(guid.Data1) << 32) | (std::uint64_t(guid.Data2) << 16) | guid.Data3, low, element});
+    });
+    std::sort(keyed.begin(), keyed.end(), [](const SKRKeyed& a, const SKRKeyed& b) {
+      return a.m_High != b.m_High ? a.m_High < b.m_High : a.m_Low < b.m_Low;
+    });
+    entries.reserve(entries.size() + keyed.size());
+    for (const SKRKeyed& entry : keyed) {
+      GUID guid{};
+      guid.Data1 = decltype(guid.Data1)(entry.m_High >> 32);
+      guid.Data2 = decltype(guid.Data2)(entry.m_High >> 16);
+      guid.Data3 = decltype(guid.Data3)(entry.m_High);
+      for (int i = 7; i >= 0; --i)
+        guid.Data4[i] = (unsigned char)(entry.m_Low >> (8 * (7 - i)));
+      entries.emplace_back(CKRGuid(guid), entry.m_pElement);
+    }
   }
 
   ConstIterator begin() const {

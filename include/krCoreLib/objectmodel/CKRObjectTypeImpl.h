@@ -19,8 +19,7 @@
 #include <map>
 #include <memory>
 
-template <class T>
-class SKRGuidTableT;
+struct SKRTrackedInstances;
 
 class KRCORELIB_API CKRObjectTypeImpl : public IKRObjectType {
 public:
@@ -82,8 +81,9 @@ private:
   CKRString m_ClassName;
   // Tracked instances by instance ID (hashed: a type may track a great many,
   // a document's field streams; the operations that list or release them go
-  // in ascending ID order all the same). Owned; a private table.
-  std::unique_ptr<SKRGuidTableT<IKRObject>> m_pInstances;
+  // in ascending ID order all the same; changes are applied in batches).
+  // Owned; a private table.
+  std::unique_ptr<SKRTrackedInstances> m_pInstances;
   IKRObjectType* m_pParentType = nullptr;
   std::map<CKRGuid, IKRObjectType*> m_ChildTypeMap;
 };

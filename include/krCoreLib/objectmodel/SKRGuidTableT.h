@@ -72,6 +72,19 @@ public:
 
   std::size_t Size() const { return m_Count; }
 
+  // Room for `count` entries without growing (never shrinks).
+  void Reserve(std::size_t count) {
+    while (2 * count > m_Slots.size())
+      Grow();
+  }
+
+  // A hint only: starts loading the slot where a look-up of `id` begins, so
+  // that a caller working through many IDs overlaps their cache misses.
+  void Prefetch(const CKRGuid& id) const {
+    if (!m_Slots.empty())
+      __builtin_prefetch(&m_Slots[Home(id)]);
+  }
+
   // Calls function(id, object) for every entry, in no particular order.
   template <class TFunction>
   void ForEach(TFunction&& function) const {

@@ -9,10 +9,19 @@
 // no comparison or copy.
 #pragma once
 
+#include <cstddef>
+#include <new>
+
 #include <krCoreLib/serialization/IKRFieldData.h>
 
 class KRCORELIB_API CKRFieldDataAdaptor : public IKRFieldData {
 public:
+  // Memory from the framework's pool of small blocks (every storable object
+  // has one per field); derived classes inherit it.
+  static void* operator new(std::size_t size);
+  static void* operator new(std::size_t size, std::align_val_t alignment);
+  static void operator delete(void* block, std::size_t size) noexcept;
+  static void operator delete(void* block, std::size_t size, std::align_val_t alignment) noexcept;
   int NotifyOfPendingChange(CKRString& newValue) override;
   void NotifyOfChange(KRF_NOTIFICATION_TYPE kind, CKRGuid id) override;
   int Equals(IKRFieldData* other) override;
@@ -26,7 +35,7 @@ public:
   IKRFieldData* GetEffectiveData() override;
   IKRFieldData* GetParentField() override;
   void SetParentField(IKRFieldData* parent) override;
-  int SetValueFromString(CKRString text) override;
+  int SetValueFromString(const CKRString& text) override;
   // The stream's Write (Read) with this field data: the stream chooses the
   // representation.
   int SerializeTo(IKRFieldStream* stream) override;

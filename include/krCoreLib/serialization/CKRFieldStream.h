@@ -7,6 +7,9 @@
 // accept every header and value without storing anything.
 #pragma once
 
+#include <cstddef>
+#include <new>
+
 #include <krCoreLib/objectmodel/CKRObjectImpl.h>
 #include <krCoreLib/serialization/IKRFieldStream.h>
 #include <krCoreLib/serialization/KRFieldTypes.h>
@@ -35,6 +38,13 @@ public:
   void SetObjectSerialized(CKRGuid session) override;
   IKRObject* GetResult() override;
   void SetResult(IKRObject* object) override;
+
+  // Memory from the framework's pool of small blocks (a document makes and
+  // releases one of these per stored object); derived classes inherit it.
+  static void* operator new(std::size_t size);
+  static void* operator new(std::size_t size, std::align_val_t alignment);
+  static void operator delete(void* block, std::size_t size) noexcept;
+  static void operator delete(void* block, std::size_t size, std::align_val_t alignment) noexcept;
 
 protected:
   CKRFieldStream() = default;

@@ -69,7 +69,7 @@ public:
   CKRString GetStringValue() override {
     return m_pValue != nullptr ? SKRFieldValueText<TValue>::ToString(*m_pValue) : CKRString();
   }
-  int SetValueFromString(CKRString text) override {
+  int SetValueFromString(const CKRString& text) override {
     return m_pValue != nullptr && SKRFieldValueText<TValue>::FromString(text, *m_pValue) ? 1 : 0;
   }
   // 0 without a field on either side or for other data types; otherwise 1

@@ -24,7 +24,7 @@ public:
   int IsGroupData() override;
   IKRFieldData* GetEffectiveData() override;
   void Release(bool deep) override;
-  int SetValueFromString(CKRString text) override;
+  int SetValueFromString(const CKRString& text) override;
   int HasFieldDataImplTypeOf(CKRGuid implementationID) override;
 
   // Appends `fieldData` unless it is a member already (null is ignored).

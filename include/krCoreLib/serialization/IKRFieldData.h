@@ -39,7 +39,7 @@ public:
   // of another object's field; null otherwise.
   virtual IKRFieldData* GetParentField() = 0;
   virtual void SetParentField(IKRFieldData* parent) = 0;
-  virtual int SetValueFromString(CKRString text) = 0;
+  virtual int SetValueFromString(const CKRString& text) = 0;
   virtual int SerializeTo(IKRFieldStream* stream) = 0;
   virtual int SerializeFrom(IKRFieldStream* stream) = 0;
   virtual int HasFieldDataImplTypeOf(CKRGuid implementationID) = 0;
