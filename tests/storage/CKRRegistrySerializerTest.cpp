@@ -99,7 +99,7 @@ protected:
     KRRegCloseKey(key);
   }
 
-  CKRXMLScratch m_Scratch;
+  CKRScratchFolder m_Scratch;
   const CKRString m_Location = L"Software\\krCoreLibTests";
 };
 
