@@ -1,5 +1,5 @@
-// CKRMathT: constants, elementary wrappers, rounding, random numbers, special
-// functions and fast approximations, in both precision pairs.
+// CKRMathT: elementary wrappers, rounding, random numbers, special functions
+// and fast approximations, in both precision pairs.
 #include "KRMathTestTypes.h"
 
 #include <algorithm>
