@@ -11,30 +11,19 @@ template <class Pair>
 class CKRDistanceTTest : public ::testing::Test {};
 TYPED_TEST_SUITE(CKRDistanceTTest, KRGeometryPairs, KRGeometryPairNames);
 
-TYPED_TEST(CKRDistanceTTest, PiecesHoldOriginAndDirection) {
+TYPED_TEST(CKRDistanceTTest, PiecesCompareByOriginAndDirection) {
   KR_GEOMETRY_TEST_TYPES;
-  using Segment = CKRSegmentT<3, Real, Other>;
   using Line = CKRLineT<3, Real, Other>;
-  const P3 a(1, 2, 3), b(4, 6, 3);
-  const Segment s(a, b);
-  EXPECT_EQ(P3(s.Origin()), a);
-  EXPECT_EQ(V3(s.Direction()), V3(Real(3), Real(4), Real(0)));
-  EXPECT_EQ(P3(s.Point2()), b);
-  Segment t;
-  t.Set(a, b);
-  EXPECT_EQ(t, s);
+  const Line s(P3(1, 2, 3), P3(4, 6, 3));
+  Line t = s;
   t.Direction()[2] = Real(1e-5);
-  EXPECT_NE(t, s);
-  EXPECT_TRUE(t.Approx_Equal(s, 3));
-  EXPECT_FALSE(t.Approx_Equal(s, 6));
+  EXPECT_TRUE(t != s && t.Approx_Equal(s, 3) && !t.Approx_Equal(s, 6));
   // < needs both the origin and the direction less (by byte images, in
   // which all-zero components come first).
   const Line low(P3(0, 0, 0), P3(0, 0, 0)), high(P3(1, 1, 1), P3(2, 2, 2));
   EXPECT_TRUE(low < high);
   EXPECT_FALSE(high < low);
   EXPECT_FALSE(low < Line(P3(1, 1, 1), P3(1, 1, 1)));  // same direction
-  const CKRRay2T<Real, Other> ray(P2(0, 0), P2(1, 0));
-  EXPECT_TRUE((CKRRay2T<Real, Other>(ray) == ray));
 }
 
 TYPED_TEST(CKRDistanceTTest, DistancesClampByKind) {

@@ -96,31 +96,6 @@ TEST(Polygon, SquaresAndHoles) {
   }
 }
 
-TEST(Polygon, ContoursAreNumberedAndClassified) {
-  Polygon polygon;
-  // A hole given counter-clockwise and reversed: stored from its last point.
-  ASSERT_TRUE(polygon.AddContour(kSquare));
-  ASSERT_TRUE(polygon.AddContour(Contour({{1, 1}, {3, 1}, {3, 3}, {1, 3}, {1, 1}}), true, true));
-  polygon.Finish();
-  ASSERT_EQ(polygon.points().size(), 8u);
-  EXPECT_EQ(polygon.points()[5].m_X, 1);
-  EXPECT_EQ(polygon.points()[5].m_Y, 3);
-  EXPECT_EQ(polygon.points()[8].m_Y, 1);
-  // Edge i runs from vertex i to its successor in the contour.
-  EXPECT_EQ(polygon.edges()[4].endPoint(1)->m_Id, 1u);
-  EXPECT_EQ(polygon.edges()[8].endPoint(1)->m_Id, 5u);
-  // At equal heights the smaller x counts as higher: (0, 0) is above (4, 0).
-  const Type expected[] = {REGULAR_DOWN, END, REGULAR_UP, START, SPLIT, REGULAR_DOWN, MERGE, REGULAR_UP};
-  for (unsigned id = 1; id <= 8; ++id)
-    EXPECT_EQ(polygon.points()[id].m_Type, expected[id - 1]) << "vertex " << id;
-  EXPECT_EQ(polygon.xmax(), 4);
-  EXPECT_EQ(polygon.ymin(), 0);
-  // A horizontal edge is keyed by its smaller x wherever the sweep is.
-  Linebase bottom = polygon.edges()[1];
-  bottom.setKeyValue(123);
-  EXPECT_EQ(bottom.keyValue(), 0);
-}
-
 TEST(Polygon, RandomPolygonsWithHolesMeetTheInvariants) {
   std::mt19937 random(KRTestSeed());
   std::uniform_int_distribution<int> vertices(5, 60);
