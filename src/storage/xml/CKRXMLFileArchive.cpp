@@ -14,6 +14,8 @@
 #include <xercesc/dom/DOMLSOutput.hpp>
 #include <xercesc/dom/DOMLSSerializer.hpp>
 #include <xercesc/framework/MemBufInputSource.hpp>
+#include <xercesc/sax/InputSource.hpp>
+#include <xercesc/util/BinInputStream.hpp>
 #include <xercesc/parsers/XercesDOMParser.hpp>
 #include <xercesc/framework/XMLFormatter.hpp>
 #include <xercesc/sax/ErrorHandler.hpp>
@@ -25,6 +27,8 @@
 #include <xercesc/util/XMLException.hpp>
 #include <xercesc/util/XMLUni.hpp>
 
+#include <algorithm>
+#include <cstdio>
 #include <cstring>
 #include <new>
 #include <string>
@@ -148,6 +152,66 @@ private:
   static constexpr std::size_t kBufferSize = 64 * 1024;
   SKRReplacementFile& m_File;
   std::vector<XMLByte> m_Buffer;
+};
+
+// The archive file as the parser's input, read in the parser's own chunks
+// rather than whole: the file's bytes never sit in memory beside the tree
+// being built from them. A read error, or more than `limit` bytes, ends
+// the input early and is remembered: the file then fails as a whole.
+class CKRArchiveFileStream : public BinInputStream {
+public:
+  CKRArchiveFileStream(std::FILE* file, std::uint64_t limit, bool& failed)
+      : m_pFile(file), m_Limit(limit), m_Failed(failed) {}
+  ~CKRArchiveFileStream() override {
+    // A close that fails after the bytes were read changes nothing read.
+    std::fclose(m_pFile);
+  }
+  XMLFilePos curPos() const override { return m_Position; }
+  XMLSize_t readBytes(XMLByte* const bytes, const XMLSize_t maxToRead) override {
+    if (m_Failed || m_Position >= m_Limit)
+      return Stop(m_Position >= m_Limit && std::fgetc(m_pFile) != EOF);
+    const XMLSize_t wanted = XMLSize_t(std::min<std::uint64_t>(maxToRead, m_Limit - m_Position));
+    const std::size_t read = std::fread(bytes, 1, wanted, m_pFile);
+    m_Position += read;
+    if (read < wanted && std::ferror(m_pFile))
+      return Stop(true);
+    return read;
+  }
+  const XMLCh* getContentType() const override { return nullptr; }
+
+private:
+  XMLSize_t Stop(bool failure) {
+    m_Failed = m_Failed || failure;
+    return 0;
+  }
+
+  std::FILE* m_pFile;
+  std::uint64_t m_Limit;
+  std::uint64_t m_Position = 0;
+  bool& m_Failed;
+};
+
+class CKRArchiveFileSource : public InputSource {
+public:
+  CKRArchiveFileSource(std::FILE* file, std::uint64_t limit, bool& failed)
+      : InputSource("archive"), m_pFile(file), m_Limit(limit), m_Failed(failed) {}
+  ~CKRArchiveFileSource() override {
+    if (m_pFile != nullptr)
+      std::fclose(m_pFile);
+  }
+  // The parser asks once; the stream then owns the file.
+  BinInputStream* makeStream() const override {
+    std::FILE* file = m_pFile;
+    m_pFile = nullptr;
+    if (file == nullptr)
+      return nullptr;
+    return new CKRArchiveFileStream(file, m_Limit, m_Failed);
+  }
+
+private:
+  mutable std::FILE* m_pFile;
+  std::uint64_t m_Limit;
+  bool& m_Failed;
 };
 
 // The file name as the file system's path: UTF-8, not empty, free of NULs.
@@ -321,35 +385,35 @@ int CKRXMLFileArchive::WriteDOMToFile() {
 int CKRXMLFileArchive::LoadDOMFromFile() {
   ReleaseTree();
   std::string path;
-  unsigned char* data = nullptr;
-  std::size_t size = 0;
   // Only a regular file is read (a directory, a pipe or a device is not).
-  if (!NativePath(m_FileName, path) || !SKRFiles::ReadWholeFile(path.c_str(), kMaxFileSize, data, size))
+  if (!NativePath(m_FileName, path) || SKRFiles::GetKind(path.c_str()) != SKRFiles::EKRKind::File)
     return 0;
-  std::unique_ptr<unsigned char[]> bytes(data);
+  std::FILE* file = SKRFiles::OpenStream(path.c_str(), "rb");
+  if (file == nullptr)
+    return 0;
   bool failed = false;
+  bool inputFailed = false;
   auto tree = std::make_unique<SKRXMLFileTree>();
   try {
+    CKRArchiveFileSource source(file, kMaxFileSize, inputFailed);
     auto parser = std::make_unique<CKRArchiveParser>();
-    MemBufInputSource source(bytes.get(), size, "archive", false);
     try {
       parser->parse(source);
     } catch (...) {
       failed = true;
     }
-    failed = failed || parser->Failed();
+    failed = failed || inputFailed || parser->Failed();
     // A refused declaration: nothing of the file is used.
     if (parser->HasDoctype())
       return 0;
-    // The tree is the archive's from here on; the parser and the file's
-    // bytes go now, before objects are loaded from the tree (the scanner
-    // keeps a record of every element name it met: a fifth of the
-    // tree's size for a store that names each object by its GUID).
+    // The tree is the archive's from here on; the parser goes now, before
+    // objects are loaded from the tree (the scanner keeps a record of
+    // every element name it met: a sixth of the tree's size for a store
+    // that names each object by its GUID).
     tree->m_pDocument = parser->adoptDocument();
   } catch (...) {
     return 0;
   }
-  bytes.reset();
   // Nothing usable was read: no root element.
   DOMElement* root = tree->m_pDocument != nullptr ? tree->m_pDocument->getDocumentElement() : nullptr;
   if (root == nullptr)
