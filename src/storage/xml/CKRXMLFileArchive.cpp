@@ -13,7 +13,6 @@
 #include <xercesc/dom/DOMImplementationRegistry.hpp>
 #include <xercesc/dom/DOMLSOutput.hpp>
 #include <xercesc/dom/DOMLSSerializer.hpp>
-#include <xercesc/framework/MemBufInputSource.hpp>
 #include <xercesc/sax/InputSource.hpp>
 #include <xercesc/util/BinInputStream.hpp>
 #include <xercesc/parsers/XercesDOMParser.hpp>
@@ -30,6 +29,7 @@
 #include <algorithm>
 #include <cstdio>
 #include <cstring>
+#include <memory>
 #include <new>
 #include <string>
 #include <vector>
@@ -61,7 +61,7 @@ public:
     setDoSchema(false);
     setValidationSchemaFullChecking(false);
     // Defence in depth should a declaration ever get through: external
-    // entities read as empty text (never fetched), the expansion of
+    // entities are never fetched or read, the expansion of
     // entities is bounded (the XML library's own default limit), and the
     // expansion appears as plain text.
     setLoadExternalDTD(false);
@@ -107,9 +107,11 @@ private:
   void error(const SAXParseException&) override {}
   void fatalError(const SAXParseException&) override { ++m_FatalErrors; }
   void resetErrors() override { m_FatalErrors = 0; }
-  InputSource* resolveEntity(XMLResourceIdentifier*) override {
-    return new MemBufInputSource(reinterpret_cast<const XMLByte*>(""), 0, "", false);
-  }
+  // No source for any external entity or subset: with default resolution
+  // disabled the library then reads nothing. (An empty source instead
+  // makes the library lose its record of the declaration when it
+  // validates against an external subset.)
+  InputSource* resolveEntity(XMLResourceIdentifier*) override { return nullptr; }
 
   SecurityManager m_Security;
   int m_FatalErrors = 0;
@@ -361,10 +363,18 @@ int CKRXMLFileArchive::WriteDOMToFile() {
     return 0;
   bool written = false;
   try {
-    DOMLSSerializer* serializer = static_cast<DOMImplementationLS*>(implementation)->createLSSerializer();
-    DOMLSOutput* output = static_cast<DOMImplementationLS*>(implementation)->createLSOutput();
     CKRWriteErrors errors;
     CKRReplacementTarget target(file);
+    // Released also when the writer throws (a character the encoding
+    // cannot hold ends the write with an exception).
+    auto release = [](auto* object) {
+      if (object != nullptr)
+        object->release();
+    };
+    std::unique_ptr<DOMLSSerializer, decltype(release)> serializer(
+        static_cast<DOMImplementationLS*>(implementation)->createLSSerializer(), release);
+    std::unique_ptr<DOMLSOutput, decltype(release)> output(
+        static_cast<DOMImplementationLS*>(implementation)->createLSOutput(), release);
     DOMConfiguration* configuration = serializer->getDomConfig();
     configuration->setParameter(XMLUni::fgDOMErrorHandler, static_cast<DOMErrorHandler*>(&errors));
     if (configuration->canSetParameter(XMLUni::fgDOMWRTFormatPrettyPrint, true))
@@ -372,10 +382,8 @@ int CKRXMLFileArchive::WriteDOMToFile() {
     output->setByteStream(&target);
     // The writer's own result is consulted too: a failure it reports is a
     // file that does not hold the tree.
-    written = serializer->write(m_pTree->m_pDocument, output) && !errors.m_Failed;
+    written = serializer->write(m_pTree->m_pDocument, output.get()) && !errors.m_Failed;
     target.flush();
-    output->release();
-    serializer->release();
   } catch (...) {
     written = false;
   }
