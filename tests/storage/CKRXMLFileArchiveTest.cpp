@@ -20,17 +20,6 @@
 
 using namespace KRTestFields;
 
-// The XML library keeps a few small objects of its error and grammar
-// paths (a DTD's declarations, the writer's error reports) beyond the end
-// of its use: each archive starts and ends the library (Open, Close), and
-// what the library set up lazily in one use is not given back when it is
-// ended. The leak checker is told to leave the library's own allocations
-// alone; the store's use of it is checked by the fuzz target, which keeps
-// the library started and finds a leak in any single input.
-extern "C" const char* __lsan_default_suppressions() {
-  return "leak:libxerces-c\n";
-}
-
 namespace {
 
 class CKRXMLFileArchiveTest : public testing::Test {

@@ -153,8 +153,9 @@ TEST_F(CKRXMLFileFieldStreamTest, AValueXMLCannotHoldFailsTheSave) {
 
 // Reading hand-made files: a missing "V" reads as empty text; a field whose
 // element occurs twice fails alone (the object does not load, the other
-// fields read and the object loads); any root name works; null-GUID and wrongly sized names are
-// skipped at every level.
+// fields read and the object loads); any root name works; text, comments
+// and processing instructions are passed over; null-GUID and wrongly sized
+// names are skipped at every level.
 TEST_F(CKRXMLFileFieldStreamTest, ReadsFieldsAsTheFileHasThem) {
   const std::string path = m_Scratch.Path("made.xml");
   KRWriteBytes(path, RecordFile(Field(kName, "") + Field(kCount, "V=\"5\""), "AnyRoot"));
@@ -177,6 +178,19 @@ TEST_F(CKRXMLFileFieldStreamTest, ReadsFieldsAsTheFileHasThem) {
   ASSERT_NE(record, nullptr);
   EXPECT_EQ(record->m_Name, L"n");
   EXPECT_EQ(record->m_Count, 0);
+  record->Release();
+  load.Release();
+
+  // Text, comments, character data sections and processing instructions
+  // around and between the field elements are not part of the store.
+  KRWriteBytes(path, RecordFile("text<!-- a comment -->" + Field(kName, "V=\"n\"") + "<?pi data?><![CDATA[<x/>]]>&amp;" +
+                                Field(kCount, "V=\"3\"") + "\n  "));
+  load = KRLoadXML(path);
+  ASSERT_TRUE(load.m_Opened);
+  record = dynamic_cast<CKRTestRecord*>(load.Document()->GetObject(m_ID, CKRTestRecord::TypeID));
+  ASSERT_NE(record, nullptr);
+  EXPECT_EQ(record->m_Name, L"n");
+  EXPECT_EQ(record->m_Count, 3);
   record->Release();
   load.Release();
 

@@ -13,7 +13,9 @@
 #include <xercesc/dom/DOMImplementationRegistry.hpp>
 #include <xercesc/dom/DOMLSOutput.hpp>
 #include <xercesc/dom/DOMLSSerializer.hpp>
-#include <xercesc/framework/MemBufInputSource.hpp>
+#include <xercesc/sax/InputSource.hpp>
+#include <xercesc/util/BinInputStream.hpp>
+#include <xercesc/parsers/XercesDOMParser.hpp>
 #include <xercesc/framework/XMLFormatter.hpp>
 #include <xercesc/sax/ErrorHandler.hpp>
 #include <xercesc/sax/SAXParseException.hpp>
@@ -24,7 +26,10 @@
 #include <xercesc/util/XMLException.hpp>
 #include <xercesc/util/XMLUni.hpp>
 
+#include <algorithm>
+#include <cstdio>
 #include <cstring>
+#include <memory>
 #include <new>
 #include <string>
 #include <vector>
@@ -56,7 +61,7 @@ public:
     setDoSchema(false);
     setValidationSchemaFullChecking(false);
     // Defence in depth should a declaration ever get through: external
-    // entities read as empty text (never fetched), the expansion of
+    // entities are never fetched or read, the expansion of
     // entities is bounded (the XML library's own default limit), and the
     // expansion appears as plain text.
     setLoadExternalDTD(false);
@@ -68,6 +73,16 @@ public:
     setErrorHandler(this);
   }
   bool Failed() const { return m_FatalErrors > 0 || m_HasDoctype; }
+
+  // Text, processing instructions and comments carry nothing of the
+  // store (its values are attributes) and are skipped while reading, so
+  // the tree holds elements and attributes only. The pretty printer's
+  // line breaks and indentation would otherwise be a text node beside
+  // every element: about a third of the tree's memory and of the time
+  // to build it.
+  void docCharacters(const XMLCh* const, const XMLSize_t, const bool) override {}
+  void ignorableWhitespace(const XMLCh* const, const XMLSize_t, const bool) override {}
+  void docPI(const XMLCh* const, const XMLCh* const) override {}
   bool HasDoctype() const { return m_HasDoctype; }
 
   // Every element name passes through the tree's name table; it grows
@@ -92,9 +107,11 @@ private:
   void error(const SAXParseException&) override {}
   void fatalError(const SAXParseException&) override { ++m_FatalErrors; }
   void resetErrors() override { m_FatalErrors = 0; }
-  InputSource* resolveEntity(XMLResourceIdentifier*) override {
-    return new MemBufInputSource(reinterpret_cast<const XMLByte*>(""), 0, "", false);
-  }
+  // No source for any external entity or subset: with default resolution
+  // disabled the library then reads nothing. (An empty source instead
+  // makes the library lose its record of the declaration when it
+  // validates against an external subset.)
+  InputSource* resolveEntity(XMLResourceIdentifier*) override { return nullptr; }
 
   SecurityManager m_Security;
   int m_FatalErrors = 0;
@@ -137,6 +154,66 @@ private:
   static constexpr std::size_t kBufferSize = 64 * 1024;
   SKRReplacementFile& m_File;
   std::vector<XMLByte> m_Buffer;
+};
+
+// The archive file as the parser's input, read in the parser's own chunks
+// rather than whole: the file's bytes never sit in memory beside the tree
+// being built from them. A read error, or more than `limit` bytes, ends
+// the input early and is remembered: the file then fails as a whole.
+class CKRArchiveFileStream : public BinInputStream {
+public:
+  CKRArchiveFileStream(std::FILE* file, std::uint64_t limit, bool& failed)
+      : m_pFile(file), m_Limit(limit), m_Failed(failed) {}
+  ~CKRArchiveFileStream() override {
+    // A close that fails after the bytes were read changes nothing read.
+    std::fclose(m_pFile);
+  }
+  XMLFilePos curPos() const override { return m_Position; }
+  XMLSize_t readBytes(XMLByte* const bytes, const XMLSize_t maxToRead) override {
+    if (m_Failed || m_Position >= m_Limit)
+      return Stop(m_Position >= m_Limit && std::fgetc(m_pFile) != EOF);
+    const XMLSize_t wanted = XMLSize_t(std::min<std::uint64_t>(maxToRead, m_Limit - m_Position));
+    const std::size_t read = std::fread(bytes, 1, wanted, m_pFile);
+    m_Position += read;
+    if (read < wanted && std::ferror(m_pFile))
+      return Stop(true);
+    return read;
+  }
+  const XMLCh* getContentType() const override { return nullptr; }
+
+private:
+  XMLSize_t Stop(bool failure) {
+    m_Failed = m_Failed || failure;
+    return 0;
+  }
+
+  std::FILE* m_pFile;
+  std::uint64_t m_Limit;
+  std::uint64_t m_Position = 0;
+  bool& m_Failed;
+};
+
+class CKRArchiveFileSource : public InputSource {
+public:
+  CKRArchiveFileSource(std::FILE* file, std::uint64_t limit, bool& failed)
+      : InputSource("archive"), m_pFile(file), m_Limit(limit), m_Failed(failed) {}
+  ~CKRArchiveFileSource() override {
+    if (m_pFile != nullptr)
+      std::fclose(m_pFile);
+  }
+  // The parser asks once; the stream then owns the file.
+  BinInputStream* makeStream() const override {
+    std::FILE* file = m_pFile;
+    m_pFile = nullptr;
+    if (file == nullptr)
+      return nullptr;
+    return new CKRArchiveFileStream(file, m_Limit, m_Failed);
+  }
+
+private:
+  mutable std::FILE* m_pFile;
+  std::uint64_t m_Limit;
+  bool& m_Failed;
 };
 
 // The file name as the file system's path: UTF-8, not empty, free of NULs.
@@ -286,10 +363,18 @@ int CKRXMLFileArchive::WriteDOMToFile() {
     return 0;
   bool written = false;
   try {
-    DOMLSSerializer* serializer = static_cast<DOMImplementationLS*>(implementation)->createLSSerializer();
-    DOMLSOutput* output = static_cast<DOMImplementationLS*>(implementation)->createLSOutput();
     CKRWriteErrors errors;
     CKRReplacementTarget target(file);
+    // Released also when the writer throws (a character the encoding
+    // cannot hold ends the write with an exception).
+    auto release = [](auto* object) {
+      if (object != nullptr)
+        object->release();
+    };
+    std::unique_ptr<DOMLSSerializer, decltype(release)> serializer(
+        static_cast<DOMImplementationLS*>(implementation)->createLSSerializer(), release);
+    std::unique_ptr<DOMLSOutput, decltype(release)> output(
+        static_cast<DOMImplementationLS*>(implementation)->createLSOutput(), release);
     DOMConfiguration* configuration = serializer->getDomConfig();
     configuration->setParameter(XMLUni::fgDOMErrorHandler, static_cast<DOMErrorHandler*>(&errors));
     if (configuration->canSetParameter(XMLUni::fgDOMWRTFormatPrettyPrint, true))
@@ -297,10 +382,8 @@ int CKRXMLFileArchive::WriteDOMToFile() {
     output->setByteStream(&target);
     // The writer's own result is consulted too: a failure it reports is a
     // file that does not hold the tree.
-    written = serializer->write(m_pTree->m_pDocument, output) && !errors.m_Failed;
+    written = serializer->write(m_pTree->m_pDocument, output.get()) && !errors.m_Failed;
     target.flush();
-    output->release();
-    serializer->release();
   } catch (...) {
     written = false;
   }
@@ -310,28 +393,32 @@ int CKRXMLFileArchive::WriteDOMToFile() {
 int CKRXMLFileArchive::LoadDOMFromFile() {
   ReleaseTree();
   std::string path;
-  unsigned char* data = nullptr;
-  std::size_t size = 0;
   // Only a regular file is read (a directory, a pipe or a device is not).
-  if (!NativePath(m_FileName, path) || !SKRFiles::ReadWholeFile(path.c_str(), kMaxFileSize, data, size))
+  if (!NativePath(m_FileName, path) || SKRFiles::GetKind(path.c_str()) != SKRFiles::EKRKind::File)
     return 0;
-  std::unique_ptr<unsigned char[]> bytes(data);
+  std::FILE* file = SKRFiles::OpenStream(path.c_str(), "rb");
+  if (file == nullptr)
+    return 0;
   bool failed = false;
+  bool inputFailed = false;
   auto tree = std::make_unique<SKRXMLFileTree>();
   try {
+    CKRArchiveFileSource source(file, kMaxFileSize, inputFailed);
     auto parser = std::make_unique<CKRArchiveParser>();
-    MemBufInputSource source(bytes.get(), size, "archive", false);
     try {
       parser->parse(source);
     } catch (...) {
       failed = true;
     }
-    failed = failed || parser->Failed();
+    failed = failed || inputFailed || parser->Failed();
     // A refused declaration: nothing of the file is used.
     if (parser->HasDoctype())
       return 0;
+    // The tree is the archive's from here on; the parser goes now, before
+    // objects are loaded from the tree (the scanner keeps a record of
+    // every element name it met: a sixth of the tree's size for a store
+    // that names each object by its GUID).
     tree->m_pDocument = parser->adoptDocument();
-    tree->m_pParser = std::move(parser);
   } catch (...) {
     return 0;
   }

@@ -34,23 +34,15 @@ CKRGuid FromXML64Characters(const XMLCh* text) {
   return id;
 }
 
-// The name table of a tree is private to the library's document class;
-// an explicit instantiation may name private members (the language allows
-// it there), and hands their member pointers out through a friend.
-struct SKRNameTableTag {
-  using Type = DOMStringPoolEntry** DOMDocumentImpl::*;
-  friend Type KRMemberOf(SKRNameTableTag);
+// The name table of a tree is a protected member of the library's document
+// class, open to classes derived from it: this one only names the members,
+// it is never made.
+class CKRDocumentNameTable : public DOMDocumentImpl {
+public:
+  CKRDocumentNameTable() = delete;
+  static DOMStringPoolEntry**& Table(DOMDocumentImpl* document) { return document->*(&CKRDocumentNameTable::fNameTable); }
+  static XMLSize_t& Size(DOMDocumentImpl* document) { return document->*(&CKRDocumentNameTable::fNameTableSize); }
 };
-struct SKRNameTableSizeTag {
-  using Type = XMLSize_t DOMDocumentImpl::*;
-  friend Type KRMemberOf(SKRNameTableSizeTag);
-};
-template <typename Tag, typename Tag::Type Member>
-struct SKRMemberAccess {
-  friend typename Tag::Type KRMemberOf(Tag) { return Member; }
-};
-template struct SKRMemberAccess<SKRNameTableTag, &DOMDocumentImpl::fNameTable>;
-template struct SKRMemberAccess<SKRNameTableSizeTag, &DOMDocumentImpl::fNameTableSize>;
 
 // Names per chain before the table grows, and the growth factor.
 constexpr std::size_t kNamesPerChain = 4;
@@ -64,8 +56,8 @@ void KRNoteNewName(DOMDocument* document, std::size_t& names) {
   auto* implementation = static_cast<DOMDocumentImpl*>(document);
   if (implementation == nullptr)
     return;
-  DOMStringPoolEntry**& table = implementation->*KRMemberOf(SKRNameTableTag());
-  XMLSize_t& size = implementation->*KRMemberOf(SKRNameTableSizeTag());
+  DOMStringPoolEntry**& table = CKRDocumentNameTable::Table(implementation);
+  XMLSize_t& size = CKRDocumentNameTable::Size(implementation);
   if (table == nullptr || names <= size * kNamesPerChain)
     return;
   // Odd sizes spread the library's hash better than powers of two.

@@ -1,6 +1,6 @@
-// The XML store's private side: the tree an open archive holds, the
-// parser that read it, and the conversions between the opaque element
-// handles of the public headers and the XML library's elements.
+// The XML store's private side: the tree an open archive holds and the
+// conversions between the opaque element handles of the public headers
+// and the XML library's elements.
 #pragma once
 
 #include <krCoreLib/objectmodel/CKRGuid.h>
@@ -9,7 +9,6 @@
 
 #include <xercesc/dom/DOMDocument.hpp>
 #include <xercesc/dom/DOMElement.hpp>
-#include <xercesc/parsers/XercesDOMParser.hpp>
 
 #include <memory>
 
@@ -21,8 +20,9 @@ struct SKRXMLFileTree {
   SKRXMLFileTree(const SKRXMLFileTree&) = delete;
   SKRXMLFileTree& operator=(const SKRXMLFileTree&) = delete;
 
-  xercesc::DOMDocument* m_pDocument = nullptr;  // owned (adopted from the parser when read)
-  std::unique_ptr<xercesc::XercesDOMParser> m_pParser;  // reading only
+  // Owned; when read, adopted from the parser, which is released as soon
+  // as the file is parsed.
+  xercesc::DOMDocument* m_pDocument = nullptr;
   std::size_t m_Names = 0;  // element names made in m_pDocument, for KRNoteNewName
 };
 

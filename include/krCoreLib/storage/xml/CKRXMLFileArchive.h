@@ -36,7 +36,7 @@
 class CKRXMLFileDocument;
 class CKRXMLFileTypeManifest;
 class CKRXMLFileFieldStream;
-// The archive's XML tree, parser and writer state (private to the store).
+// The archive's XML tree (private to the store).
 struct SKRXMLFileTree;
 
 class KRCORELIB_API CKRXMLFileArchive : public CKRArchive {
@@ -47,7 +47,7 @@ public:
   // tree would not fit the memory of the machines the library runs on.
   static constexpr std::uint64_t kMaxFileSize = std::uint64_t(1) << 30;
 
-  // Forgets the tree and the parser.
+  // Forgets the tree.
   int OnInitialize() override;
 
   // Sets the file name ("/" separated; UTF-8 on the file system): 1.
@@ -90,7 +90,7 @@ private:
   friend class CKRXMLFileTypeManifest;
   friend class CKRXMLFileFieldStream;
 
-  // Releases the tree and the parser, if any.
+  // Releases the tree, if any.
   void ReleaseTree();
   // Ends this archive's use of the XML library, if it started it.
   void EndLibraryUse();
