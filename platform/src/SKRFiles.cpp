@@ -346,6 +346,23 @@ std::FILE* SKRFiles::OpenStream(const char* path, const char* mode) noexcept {
   return stream;
 }
 
+std::FILE* SKRFiles::OpenRegularFileForReading(const char* path, std::uint64_t maxSize) noexcept {
+  const int fd = Retry([&] { return ::open(path, O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK); });
+  if (fd < 0)
+    return nullptr;
+  struct stat info {};
+  const int status = ::fcntl(fd, F_GETFL);
+  if (::fstat(fd, &info) != 0 || !S_ISREG(info.st_mode) || info.st_size < 0 ||
+      std::uint64_t(info.st_size) > maxSize || status < 0 || ::fcntl(fd, F_SETFL, status & ~O_NONBLOCK) != 0) {
+    ::close(fd);
+    return nullptr;
+  }
+  std::FILE* stream = ::fdopen(fd, "rb");
+  if (stream == nullptr)
+    ::close(fd);
+  return stream;
+}
+
 bool SKRReplacementFile::Begin(const char* path) noexcept {
   Abandon();
   m_Failed = false;

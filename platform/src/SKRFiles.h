@@ -63,6 +63,11 @@ struct SKRFiles {
   // without waiting in open for the other end of a pipe. Null on failure or
   // for a mode it does not know.
   static std::FILE* OpenStream(const char* path, const char* mode) noexcept;
+  // Opens a regular file of at most `maxSize` bytes for reading. The kind
+  // and size are checked on the opened descriptor, so a name swapped for a
+  // pipe, a device or a directory after a check by name is refused too.
+  // Null on failure.
+  static std::FILE* OpenRegularFileForReading(const char* path, std::uint64_t maxSize) noexcept;
 };
 
 // A file that replaces another one whole or not at all: written under a

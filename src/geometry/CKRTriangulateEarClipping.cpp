@@ -61,7 +61,7 @@ const wchar_t* CKRTriangulateEarClipping<Real, Other>::Check(int n, const Vector
 }
 
 // The integer strategies need small integral coordinates: the bounding box
-// goes to [0, 2^20] (64-bit determinants of such differences stay below
+// goes into [0, 2^20] (64-bit determinants of such differences stay below
 // 2^42) or [0, 2^24] (the multi-word integers' 32-bit differences); the
 // floating-point strategy works in the unit square.
 template <class Real, class Other>
@@ -92,8 +92,11 @@ void CKRTriangulateEarClipping<Real, Other>::MakeQuery(int n, const Vector* posi
     maxX = std::max(maxX, double(positions[i].X()));
     maxY = std::max(maxY, double(positions[i].Y()));
   }
+  // A power of two: scaling then rounds nothing, so integral (or dyadic)
+  // input keeps its exact positions and its exact decisions whenever the
+  // scaled box holds its spacing.
   const double extent = std::max(maxX - minX, maxY - minY);
-  const double scale = extent > 0 ? range / extent : 1;
+  const double scale = extent > 0 ? std::exp2(std::floor(std::log2(range / extent))) : 1;
   m_Scaled.resize(std::size_t(n));
   for (int i = 0; i < n; ++i)
     m_Scaled[std::size_t(i)] = Vector(float((positions[i].X() - minX) * scale), float((positions[i].Y() - minY) * scale));

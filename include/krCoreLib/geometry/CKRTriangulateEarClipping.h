@@ -29,14 +29,17 @@
 // where an ear remains; such a vertex may end up in a triangle of zero area.
 //
 // Positions given to the query: TYPE_INT64 and TYPE_INTEGER translate the
-// vertices by their bounding box's minimum corner and scale them by 2^20 / s
-// and 2^24 / s (s the larger extent of the box; s = 0 leaves the scale at 1,
-// though such input has no area and is refused first), TYPE_REAL by 1 / s;
-// TYPE_RATIONAL and TYPE_FILTERED use the input positions. The integer
-// strategies truncate the scaled coordinates, so vertices closer than
-// s / 2^20 (s / 2^24) may merge and their decisions are exact only for
-// what remains; the rational and filtered strategies are exact within the
-// ranges KRQuery2.h documents, TYPE_REAL is not exact.
+// vertices by their bounding box's minimum corner and scale them by the
+// largest power of two that keeps the box within 2^20 and 2^24 (s the larger
+// extent of the box; s = 0 leaves the scale at 1, though such input has no
+// area and is refused first), TYPE_REAL by the power of two nearest below
+// 1 / s; TYPE_RATIONAL and TYPE_FILTERED use the input positions. Scaling
+// by a power of two rounds nothing: integral input whose box fits is used
+// at its exact positions. The integer strategies truncate the scaled
+// coordinates, so vertices closer than 2s / 2^20 (2s / 2^24) may merge and
+// their decisions are exact only for what remains; the rational and
+// filtered strategies are exact within the ranges KRQuery2.h documents,
+// TYPE_REAL is not exact.
 //
 // Cost: O(n) for a convex polygon, O(n r) ear tests otherwise (r the number
 // of reflex vertices). Each object is used by one thread; distinct objects

@@ -393,10 +393,11 @@ int CKRXMLFileArchive::WriteDOMToFile() {
 int CKRXMLFileArchive::LoadDOMFromFile() {
   ReleaseTree();
   std::string path;
-  // Only a regular file is read (a directory, a pipe or a device is not).
-  if (!NativePath(m_FileName, path) || SKRFiles::GetKind(path.c_str()) != SKRFiles::EKRKind::File)
+  // Only a regular file is read (a directory, a pipe or a device is not),
+  // and only up to kMaxFileSize, checked on what was opened.
+  if (!NativePath(m_FileName, path))
     return 0;
-  std::FILE* file = SKRFiles::OpenStream(path.c_str(), "rb");
+  std::FILE* file = SKRFiles::OpenRegularFileForReading(path.c_str(), kMaxFileSize);
   if (file == nullptr)
     return 0;
   bool failed = false;
