@@ -81,8 +81,14 @@ bool AppendText(std::string& out, const std::uint8_t* data, std::size_t size) {
 
 void AppendValue(std::string& out, const wchar_t* name, std::size_t nameLength, std::uint32_t type,
                  const std::uint8_t* data, std::size_t size) {
+  // A value name is quoted as a text is: a quote or a backslash in it would
+  // otherwise end the name early for whoever reads the file.
   out.push_back('"');
-  AppendNarrow(out, name, nameLength);
+  for (std::size_t i = 0; i < nameLength; ++i) {
+    if (name[i] == L'"' || name[i] == L'\\')
+      out.push_back('\\');
+    AppendNarrow(out, name + i, 1);
+  }
   out.append("\"=");
   if (type == KRREG_SZ && AppendText(out, data, size)) {
   } else if (type == KRREG_DWORD && size == 4) {

@@ -201,7 +201,7 @@ TEST_F(CKRRegistryFixture, ExportWritesRegedit4ByteForByte) {
   put(a, L"bin", KRREG_BINARY, bytes);
   put(a, L"", KRREG_EXPAND_SZ, Utf16(std::u16string(u"%P%\0", 4)));
   put(a, L"wide", KRREG_SZ, Utf16(std::u16string(u"\u4e2d\0", 2)));
-  put(a, L"odd", 0x1b, "\xff");
+  put(a, L"o\"d\\d", 0x1b, "\xff");
   HKEY child = nullptr;
   ASSERT_EQ(KRRegCreateKeyEx(a, L"b\\C", 0, KRKEY_ALL_ACCESS, &child, nullptr), 0);
   put(child, L"multi", KRREG_MULTI_SZ, Utf16(std::u16string(u"x\0\0", 3)));
@@ -220,7 +220,7 @@ TEST_F(CKRRegistryFixture, ExportWritesRegedit4ByteForByte) {
       "  21\r\n"
       "\"\"=hex(2):25,00,50,00,25,00,00,00\r\n"
       "\"wide\"=hex(1):2d,4e,00,00\r\n"
-      "\"odd\"=hex(1b):ff\r\n"
+      "\"o\\\"d\\\\d\"=hex(1b):ff\r\n"
       "\r\n[HKEY_CURRENT_USER\\Software\\A\\b]\r\n"
       "\r\n[HKEY_CURRENT_USER\\Software\\A\\b\\C]\r\n"
       "\"multi\"=hex(7):78,00,00,00,00,00\r\n"
