@@ -323,6 +323,27 @@ TEST_F(CKRRegistryScratch, ConcurrentWritersLoseNothing) {
   EXPECT_EQ(KRRegCloseKey(key), 0);
 }
 
+TEST_F(CKRRegistryScratch, ForkedChildUsesAConnectionOfItsOwn) {
+  HKEY key = Create(L"Software\\Forked");
+  ASSERT_EQ(Put(key, L"parent", KRREG_BINARY, "p"), 0);
+  const pid_t child = ::fork();
+  ASSERT_GE(child, 0);
+  if (child == 0) {
+    // The inherited handle belongs to the parent's connection; a new one
+    // reads what the parent wrote and writes for it.
+    HKEY own = nullptr;
+    const bool good = KRRegQueryInfoKey(key, nullptr, nullptr, nullptr, nullptr, nullptr) == KRERROR_INVALID_HANDLE &&
+                      KRRegOpenKeyEx(HKEY_CURRENT_USER, L"Software\\Forked", 0, KRKEY_ALL_ACCESS, &own) == 0 &&
+                      Get(own, L"parent") == "p" && Put(own, L"child", KRREG_BINARY, "c") == 0;
+    ::_exit(good ? 0 : 1);
+  }
+  EXPECT_EQ(KRWaitChild(child), 0);
+  EXPECT_EQ(Get(key, L"child"), "c");
+  ASSERT_EQ(Put(key, L"after", KRREG_BINARY, "a"), 0);
+  EXPECT_EQ(Get(key, L"after"), "a");
+  EXPECT_EQ(KRRegCloseKey(key), 0);
+}
+
 TEST_F(CKRRegistryScratch, KilledWriterLeavesEveryCommittedValue) {
   const pid_t child = StartHelper(3, "k", 0);
   HKEY key = nullptr;

@@ -28,8 +28,10 @@
 // access only. A handle that was never returned, is already closed, or
 // refers to a key deleted since (or to a volatile key whose store was
 // cleared) gives KRERROR_INVALID_HANDLE; closing it still succeeds for a
-// handle of a deleted key. A forked child must not use the registry before
-// it execs (the store's connection cannot be carried across fork).
+// handle of a deleted key. A forked child opens a connection of its own on
+// its first call and leaves its parent's alone; handles it inherited are
+// then invalid. As with any lock, a child forked while another thread was
+// inside a registry call must exec before it uses the registry.
 #pragma once
 
 #include <krCoreLib/core/KRExport.h>
