@@ -127,11 +127,12 @@ public:
   // at positions 16, 32, ... (from 0) the line continues on the next: ","
   // then "\" and CR LF, and two spaces. Key paths and value names are
   // written one byte per character; a character above U+00FF in them is
-  // written as "?".
+  // written as "?", and '"' and '\' in a value name are escaped with '\'.
   static bool WriteRegistryTreeToFile(HKEY root, const wchar_t* subkey, const wchar_t* file);
   // The same for a path "ROOT\subkey", ROOT being a root key's name or its
-  // short form (HKCR, HKCU, HKLM, HKCC, HKU, HKPD, HKDD), compared over its
-  // own length; false for a path without "\" or with an unknown root.
+  // short form (HKCR, HKCU, HKLM, HKCC, HKU, HKPD, HKDD): the whole part
+  // before the first "\", case-sensitive (so "HKEY_C" names no root); false
+  // for a path without "\" or with an unknown root.
   static bool WriteRegistryTreeToFile(const wchar_t* keyPath, const wchar_t* file);
 
 private:
