@@ -36,9 +36,15 @@ CKRObjGuidPtrMap<CKRTypeManifest>::Iterator CKRDocument::GetTypeManifestIterator
 IKRObject* CKRDocument::GetObject(CKRGuid instanceID, CKRGuid typeID) {
   // A type the type system does not know, or not the class the link
   // requires, makes nothing, not even a manifest or stream for it. The
-  // requirement is used up here: the fields of the object name their own.
+  // requirement is lifted while this object loads (its fields name their
+  // own) and holds again for the caller's next link when this call returns.
   const CKRGuid required = m_RequiredLinkType;
   m_RequiredLinkType = CKRGuid();
+  struct SKRRequirementRestore {
+    CKRGuid& m_Slot;
+    const CKRGuid& m_Value;
+    ~SKRRequirementRestore() { m_Slot = m_Value; }
+  } restore{m_RequiredLinkType, required};
   IKRObjectType* type = CKRTypeSystem::FindType(typeID);
   if (type == nullptr || (required.IsValid() && type->IsTypeOf(required) == 0))
     return nullptr;

@@ -249,7 +249,8 @@ TEST_F(CKRDocumentTest, HostileStoredDataLoadsSafely) {
   object.m_Links[kChildren] = {{CKRGuid::CreateNewGUID(), CKRGuid::CreateNewGUID()},  // unknown type
                                {CKRTestPlain::TypeID, CKRGuid::CreateNewGUID()},     // not storable
                                {CKRTestRecord::TypeID, CKRGuid::CreateNewGUID()},    // never stored
-                               {CKRGuid(), CKRGuid()}};
+                               {CKRGuid(), CKRGuid()},
+                               {CKRTestLeaf::TypeID, leafID}};  // storable, but not a record
   const CKRGuid refused = CKRGuid::CreateNewGUID();
   stored.m_Objects[refused].m_TypeID = CKRTestRecord::TypeID;
 

@@ -41,12 +41,13 @@ public:
   // Also null, creating nothing, when a link type is required (see
   // RequireLinkType) and the stored type is neither it nor derived from it.
   virtual IKRObject* GetObject(CKRGuid instanceID, CKRGuid typeID);
-  // Sets the class the next GetObject must yield (the stored type that type
-  // or derived from it) and returns the requirement it replaces, for the
+  // Sets the class that GetObject must yield (the stored type that type or
+  // derived from it) and returns the requirement it replaces, for the
   // caller to restore. A link field names its member's class around its
-  // ReadLink, so that a stored object of another class is not created only
-  // to be refused. It holds for one GetObject, not for the objects that one
-  // links to; the null ID requires nothing.
+  // ReadLink or ReadLinks, so that a stored object of another class is not
+  // created only to be refused. It holds for the caller's GetObject calls
+  // until it is restored, not for the objects those link to (it is lifted
+  // while an object loads); the null ID requires nothing.
   CKRGuid RequireLinkType(CKRGuid typeID);
   // A new manifest for `typeID`, made by `manifestType` (a fresh instance
   // ID, then re-keyed to `typeID`); null when the type is null, not a

@@ -10,6 +10,7 @@
 #pragma once
 
 #include <krCoreLib/objectmodel/IKRCollection.h>
+#include <krCoreLib/serialization/CKRDocument.h>
 #include <krCoreLib/serialization/CKRFieldAdaptor.h>
 #include <krCoreLib/serialization/CKRFieldDataAdaptor.h>
 #include <krCoreLib/serialization/IKRFieldStream.h>
@@ -17,6 +18,17 @@
 
 template <class TCollection>
 class CKRObjCollectionFieldDataT;
+
+// The element class of a collection template (CKRObjPtrList<T>,
+// CKRObjGuidPtrMap<T>): T; void for other collections.
+template <class TCollection>
+struct SKRCollectionElement {
+  using Type = void;
+};
+template <template <class> class TTemplate, class T>
+struct SKRCollectionElement<TTemplate<T>> {
+  using Type = T;
+};
 
 // The descriptor of a collection of links; no plain-text storage.
 template <class TCollection>
@@ -59,9 +71,24 @@ public:
       }
     return 1;
   }
-  // The stream adds the linked objects to the collection.
+  // The stream adds the linked objects to the collection. An element class
+  // with a type ID has the document require that class, so a link stored
+  // with another class creates no object (which the collection would
+  // refuse and nothing would hold).
   int SerializeFrom(IKRFieldStream* stream) override {
-    return stream != nullptr ? stream->ReadLinks(this, m_pCollection) : 0;
+    if (stream == nullptr)
+      return 0;
+    using TElement = typename SKRCollectionElement<TCollection>::Type;
+    if constexpr (requires { TElement::TypeID; }) {
+      CKRDocument* document = stream->GetDocument();
+      const CKRGuid previous = document != nullptr ? document->RequireLinkType(TElement::TypeID) : CKRGuid();
+      const int result = stream->ReadLinks(this, m_pCollection);
+      if (document != nullptr)
+        document->RequireLinkType(previous);
+      return result;
+    } else {
+      return stream->ReadLinks(this, m_pCollection);
+    }
   }
   int HasFieldDataImplTypeOf(CKRGuid implementationID) override {
     return implementationID == KRIMPL_FIELDDATA_COLLECTION ? 1 : 0;
