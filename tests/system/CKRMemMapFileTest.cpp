@@ -29,7 +29,7 @@ void ExpectEmpty(CKRMemMapFile& map) {
 
 }  // namespace
 
-TEST(CKRMemMapFile, WritesThroughAFileMappingReachTheFile) {
+TEST(CKRMemMapFile, WritesThroughAFileMappingReachTheFileButTheTerminatorNever) {
   EXPECT_EQ(CKRMemMapFile::MakeMappingName(L"/home/u\\Doc.txt"), L"_HOME_U_DOC.TXT");
   CKRFilesScratch scratch;
   scratch.WriteFile("data.bin", "hello, world");
@@ -58,23 +58,20 @@ TEST(CKRMemMapFile, WritesThroughAFileMappingReachTheFile) {
   char first = 0;
   EXPECT_EQ(::pread(fd, &first, 1, 0), 1) << "still open";
   ::close(fd);
-}
 
-TEST(CKRMemMapFile, TerminatorFollowsTheDataButNeverReachesTheFile) {
-  CKRFilesScratch scratch;
-  // At a page's end the terminator needs a page of its own.
+  // A terminator follows the data but never reaches the file; at a page's
+  // end it needs a page of its own.
   for (const std::size_t size : {std::size_t(10), std::size_t(4096), std::size_t(8190)}) {
     for (const bool readOnly : {false, true}) {
       SCOPED_TRACE(testing::Message() << size << (readOnly ? " read-only" : " read-write"));
       const std::string content(size, 'x');
       scratch.WriteFile("text", content);
-      CKRMemMapFile map;
       ASSERT_EQ(map.MapFile(scratch.Wide("text").GetString(), readOnly, 0, true), 1);
-      const auto* view = static_cast<const unsigned char*>(map.Open(1000));
-      ASSERT_NE(view, nullptr);
+      const auto* text = static_cast<const unsigned char*>(map.Open(1000));
+      ASSERT_NE(text, nullptr);
       EXPECT_EQ(map.GetSize(), size);
-      EXPECT_EQ(view[size - 1], 'x');
-      EXPECT_EQ(view[size] | view[size + 1], 0);
+      EXPECT_EQ(text[size - 1], 'x');
+      EXPECT_EQ(text[size] | text[size + 1], 0);
       map.UnMap();
       EXPECT_EQ(KRLoadText(scratch.Wide("text")), content) << "the file keeps its size";
     }
@@ -219,7 +216,7 @@ TEST(CKRMemMapFile, MemoryNotTheUsersOwnIsRefusedAndLeftAlone) {
     for (const std::string& object : objects) {
       struct stat info {};
       EXPECT_EQ(::stat(object.c_str(), &info), 0) << object << " is left alone";
-      EXPECT_EQ(info.st_uid, KRAnotherUser());
+      EXPECT_EQ(info.st_uid, kKRAnotherUser);
     }
   }
 

@@ -2,9 +2,7 @@
 
 #include "KRThreadTestSupport.h"
 
-using krtest::CActor;
-using krtest::CFunctionThread;
-using krtest::WaitUntil;
+using namespace krtest;
 
 namespace {
 
@@ -20,14 +18,8 @@ void ExpectFree(TLock& lock) {
 // Both locks: what they share is tested on each.
 template <class TLock>
 class CKRReaderWriterLockTest : public testing::Test {};
-struct SKRLockNames {
-  template <class TLock>
-  static std::string GetName(int) {
-    return std::is_same_v<TLock, CKRReaderWriterLock> ? "CKRReaderWriterLock" : "CReaderWriterLockNonReentrance";
-  }
-};
 using KRLockTypes = testing::Types<CReaderWriterLockNonReentrance, CKRReaderWriterLock>;
-TYPED_TEST_SUITE(CKRReaderWriterLockTest, KRLockTypes, SKRLockNames);
+TYPED_TEST_SUITE(CKRReaderWriterLockTest, KRLockTypes);
 
 // A writer waits for a reader; readers arriving behind a waiting writer wait
 // too, and a second writer still goes before them.
@@ -62,7 +54,7 @@ TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
 
 // Releasing what the thread does not hold changes nothing and is reported.
 TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
-  krtest::CDebugRecorder recorder;
+  CDebugRecorder recorder;
   TypeParam lock;
   CActor reader, writer;
   ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
@@ -95,15 +87,19 @@ TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
 // asked.
 TYPED_TEST(CKRReaderWriterLockTest, KilledWaitersLeaveTheLockConsistent) {
   TypeParam lock;
+  // A thread that asks for the lock, killed once `waits` shows it waiting.
+  auto killWaiter = [&](bool write, auto waits) {
+    CFunctionThread waiter([&](CFunctionThread&) -> unsigned long {
+      write ? lock.AcquireWriterLock() : lock.AcquireReaderLock();
+      return 1;
+    });
+    waiter.Start();
+    ASSERT_TRUE(WaitUntil(waits));
+    waiter.Kill(7);
+  };
   CActor holder, another;
   ASSERT_TRUE(holder.Do([&] { lock.AcquireReaderLock(); }));
-  CFunctionThread writer([&](CFunctionThread&) -> unsigned long {
-    lock.AcquireWriterLock();
-    return 1;
-  });
-  writer.Start();
-  ASSERT_TRUE(WaitUntil([&] { return lock.GetWriterCount() == 1; }));
-  writer.Kill(7);
+  killWaiter(true, [&] { return lock.GetWriterCount() == 1; });
   EXPECT_EQ(lock.GetWriterCount(), 0);
   EXPECT_EQ(lock.GetReaderCount(), 1);
   // New readers are not held up by the writer that is gone.
@@ -116,13 +112,7 @@ TYPED_TEST(CKRReaderWriterLockTest, KilledWaitersLeaveTheLockConsistent) {
     lock.AcquireWriterLock();
   }));
 
-  CFunctionThread reader([&](CFunctionThread&) -> unsigned long {
-    lock.AcquireReaderLock();
-    return 1;
-  });
-  reader.Start();
-  ASSERT_TRUE(WaitUntil([&] { return lock.GetWaitingReaderCount() == 1; }));
-  reader.Kill(8);
+  killWaiter(false, [&] { return lock.GetWaitingReaderCount() == 1; });
   EXPECT_EQ(lock.GetWaitingReaderCount(), 0);
   ASSERT_TRUE(holder.Do([&] { lock.ReleaseWriterLock(); }));
   ASSERT_TRUE(another.Do([&] {
@@ -195,29 +185,27 @@ TYPED_TEST(CKRReaderWriterLockTest, ReadersAndWritersNeverSeeATornUpdate) {
   ExpectFree(lock);
 }
 
-TEST(CKRReaderWriterLock, ARecursiveReaderDoesNotWaitForAWaitingWriter) {
+// A recursive reader does not wait for a waiting writer; a reader upgrades
+// once the other readers left, and downgrades back to reading.
+TEST(CKRReaderWriterLock, ReentersReadingUpgradesAndDowngrades) {
   CKRReaderWriterLock lock;
-  CActor reader, writer;
-  ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
+  CActor upgrader, otherReader, lateReader;
+  ASSERT_TRUE(upgrader.Do([&] { lock.AcquireReaderLock(); }));
   std::atomic<bool> written{false};
-  const auto writing = writer.Post([&] {
+  const auto writing = lateReader.Post([&] {
     lock.AcquireWriterLock();
     written = true;
     lock.ReleaseWriterLock();
   });
   ASSERT_TRUE(WaitUntil([&] { return lock.GetWriterCount() == 1; }));
   // A non-reentrant lock would deadlock here.
-  ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
+  ASSERT_TRUE(upgrader.Do([&] { lock.AcquireReaderLock(); }));
   EXPECT_EQ(lock.GetReaderCount(), 1);
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseReaderLock(); }));
+  ASSERT_TRUE(upgrader.Do([&] { lock.ReleaseReaderLock(); }));
   EXPECT_FALSE(written.load());
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseReaderLock(); }));
+  ASSERT_TRUE(upgrader.Do([&] { lock.ReleaseReaderLock(); }));
   EXPECT_TRUE(writing->Wait());
-}
 
-TEST(CKRReaderWriterLock, UpgradesAfterOtherReadersLeaveAndDowngradesToReading) {
-  CKRReaderWriterLock lock;
-  CActor upgrader, otherReader, lateReader;
   ASSERT_TRUE(upgrader.Do([&] { lock.AcquireReaderLock(); }));
   ASSERT_TRUE(otherReader.Do([&] { lock.AcquireReaderLock(); }));
   const auto upgraded = upgrader.Post([&] { lock.AcquireWriterLock(); });
@@ -260,7 +248,7 @@ TEST(CKRReaderWriterLock, AThreadMayHoldManyLocksAtOnce) {
   }
   std::mt19937 random(KRTestSeed());
   std::shuffle(order.begin(), order.end(), random);
-  krtest::CDebugRecorder recorder;
+  CDebugRecorder recorder;
   for (int i : order) {
     if (i % 3 == 0)
       locks[i].ReleaseWriterLock();

@@ -1,9 +1,8 @@
 #include <krCoreLib/system/CKRSingleAppInstance.h>
 
 #include "KRFilesScratch.h"
+#include "KRThreadTestSupport.h"
 
-#include <condition_variable>
-#include <mutex>
 #include <sys/socket.h>
 #include <sys/un.h>
 
@@ -64,26 +63,8 @@ int DetectInChild(const CKRString& id, std::vector<const char*> arguments = {}, 
   return status == 20 ? kNotDetected : status;
 }
 
-// What the running instance's listener was asked: an empty file name for an
-// activation without one.
-class CKRRequests {
-public:
-  void Add(const CKRString& file) {
-    const std::lock_guard<std::mutex> lock(m_Mutex);
-    m_Requests.push_back(file);
-    m_Changed.notify_all();
-  }
-  std::vector<CKRString> WaitFor(std::size_t count) {
-    std::unique_lock<std::mutex> lock(m_Mutex);
-    m_Changed.wait_for(lock, std::chrono::seconds(60), [&] { return m_Requests.size() >= count; });
-    return m_Requests;
-  }
-
-private:
-  std::mutex m_Mutex;
-  std::condition_variable m_Changed;
-  std::vector<CKRString> m_Requests;
-};
+// What the running instance's listener was asked.
+using CKRRequests = krtest::CRecords<CKRString>;
 
 }  // namespace
 
@@ -166,7 +147,7 @@ TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
   ::close(start[1]);
   for (const pid_t child : children)
     EXPECT_EQ(KRWaitChild(child), KRHANDOVER_DELIVERED);
-  std::vector<CKRString> received = requests.WaitFor(kInstances);
+  std::vector<CKRString> received = requests.WaitFor(kInstances, std::chrono::seconds(60));
   std::sort(received.begin(), received.end());
   std::sort(expected.begin(), expected.end());
   EXPECT_EQ(received, expected);
@@ -217,41 +198,37 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"open").GetString(), 0, nullptr));
 }
 
-TEST(CKRSingleAppInstance, FoldersOfAnotherUserAreNotUsed) {
-  if (!KRCanActAsAnotherUser())
-    GTEST_SKIP() << "needs root to give folders to a second user";
-  CKRScratchRuntime scratch;
-  // A private folder of another user is refused ...
-  ::unsetenv("XDG_RUNTIME_DIR");
-  const std::string unsafe = scratch.UseOtherTemporaryFolder();
-  ::mkdir(scratch.Native(unsafe).c_str(), 0700);
-  ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), KRAnotherUser(), KRAnotherUser()), 0);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"other's").GetString(), 0, nullptr));
-  // ... and a runtime folder of another user is passed over for the
-  // private one.
-  ASSERT_EQ(::chown(scratch.Native("run").c_str(), KRAnotherUser(), KRAnotherUser()), 0);
-  ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
-  ::setenv("TMPDIR", scratch.Native().c_str(), 1);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"passed over").GetString(), 0, nullptr));
-  EXPECT_EQ(DetectInChild(UniqueID(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
-}
-
-// Shared memory that another user planted under the application ID: the
-// file name is not written into it, and the hand-over is reported failed.
-TEST(CKRSingleAppInstance, AHandOverThroughMemoryOfAnotherUserFails) {
+// What another user owns is never used: shared memory planted under the
+// application ID (the file name is not written into it, and the hand-over
+// is reported failed), a private folder of that user, a runtime folder of
+// that user (passed over for the private one).
+TEST(CKRSingleAppInstance, WhatAnotherUserOwnsIsNotUsed) {
   if (!KRCanActAsAnotherUser())
     GTEST_SKIP() << "needs root to act as a second user";
   CKRScratchRuntime scratch;
   const CKRString id = UniqueID(L"planted");
   const std::vector<std::string> objects = KRSharedObjectsOf(id);   // the block and its lock
   ASSERT_EQ(objects.size(), 2u);
-  CKRRequests requests;
-  CKRSingleAppInstanceListener listener;
-  ASSERT_TRUE(listener.Start(
-      id.GetString(), [&] { requests.Add(L"activation"); }, [&](const CKRString& file) { requests.Add(file); }));
-  CKRPlantedObjects planted(objects);
-  ASSERT_TRUE(planted.IsPlanted());
-  EXPECT_EQ(DetectInChild(id, {"/data/secret.kr"}), KRHANDOVER_FAILED);
-  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
-  EXPECT_EQ(requests.WaitFor(2), (std::vector<CKRString>{L"activation", L"activation"})) << "no file arrived";
+  {
+    CKRRequests requests;
+    CKRSingleAppInstanceListener listener;
+    ASSERT_TRUE(listener.Start(
+        id.GetString(), [&] { requests.Add(L"activation"); }, [&](const CKRString& file) { requests.Add(file); }));
+    CKRPlantedObjects planted(objects);
+    ASSERT_TRUE(planted.IsPlanted());
+    EXPECT_EQ(DetectInChild(id, {"/data/secret.kr"}), KRHANDOVER_FAILED);
+    EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
+    EXPECT_EQ(requests.WaitFor(2), (std::vector<CKRString>{L"activation", L"activation"})) << "no file arrived";
+  }
+
+  ::unsetenv("XDG_RUNTIME_DIR");
+  const std::string unsafe = scratch.UseOtherTemporaryFolder();
+  ::mkdir(scratch.Native(unsafe).c_str(), 0700);
+  ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), kKRAnotherUser, kKRAnotherUser), 0);
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"other's").GetString(), 0, nullptr));
+  ASSERT_EQ(::chown(scratch.Native("run").c_str(), kKRAnotherUser, kKRAnotherUser), 0);
+  ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
+  ::setenv("TMPDIR", scratch.Native().c_str(), 1);
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"passed over").GetString(), 0, nullptr));
+  EXPECT_EQ(DetectInChild(UniqueID(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
 }

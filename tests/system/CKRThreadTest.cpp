@@ -7,11 +7,7 @@
 #include <cstdio>
 #include <unistd.h>
 
-using krtest::CFunctionThread;
-using krtest::CGate;
-using krtest::kGenerousSteps;
-using krtest::kNotStopped;
-using krtest::Stopped;
+using namespace krtest;
 
 TEST(CKRThread, RunsItsHandlerAndStartsAgainAfterItEnded) {
   std::atomic<int> runs{0};
@@ -89,8 +85,7 @@ TEST(CKRThread, StopEndsAHandlerThatReactsAndNeverWaitsOnItsOwnThread) {
       self.WaitForNotification(command, KRTHREAD_INFINITE);
     return 42;
   });
-  reacting.Start();
-  EXPECT_EQ(Stopped(reacting), 42u);
+  EXPECT_EQ(Ran(reacting), 42u);
   EXPECT_EQ(reacting.GetActivityStatus(), KRTHREAD_STATUS_IDLE);
 
   // Stop called by the handler on its own thread queues "stop" and returns.
@@ -102,8 +97,7 @@ TEST(CKRThread, StopEndsAHandlerThatReactsAndNeverWaitsOnItsOwnThread) {
     me.WaitForNotification(command, KRTHREAD_INFINITE);
     return static_cast<unsigned long>(command);
   });
-  self.Start();
-  EXPECT_EQ(Stopped(self), static_cast<unsigned long>(KRTHREAD_CMD_STARTED)) << "\"started\" came first";
+  EXPECT_EQ(Ran(self), static_cast<unsigned long>(KRTHREAD_CMD_STARTED)) << "\"started\" came first";
   EXPECT_EQ(ownStop.load(), 0);
 }
 
@@ -115,10 +109,10 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
 
   using Wait = std::function<void(CFunctionThread&)>;
   const std::pair<const char*, Wait> cases[] = {
-      {"command wait", [](CFunctionThread& self) { krtest::IgnoreCommands(self); }},
+      {"command wait", [](CFunctionThread& self) { IgnoreCommands(self); }},
       // A timed wait, which a cancellation could not end under the address
       // sanitizer.
-      {"timed command wait", [](CFunctionThread& self) { krtest::IgnoreCommands(self, 60000); }},
+      {"timed command wait", [](CFunctionThread& self) { IgnoreCommands(self, 60000); }},
       {"process lock", [](CFunctionThread&) { CKRThread::ProcessLock(); }},
       {"status wait", [](CFunctionThread& self) { self.WaitForActivityStatus(99, KRTHREAD_INFINITE); }},
       {"computing", [](CFunctionThread&) {
@@ -162,11 +156,10 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
     after = true;
     return 1;
   });
-  suicidal.Start();
-  EXPECT_EQ(Stopped(suicidal), 9u);
+  EXPECT_EQ(Ran(suicidal), 9u);
   EXPECT_FALSE(after.load());
   // OnKill runs on the ending thread, just after the run ended.
-  EXPECT_TRUE(krtest::WaitUntil([&] { return suicidal.m_KillCount.load() == 1; }));
+  EXPECT_TRUE(WaitUntil([&] { return suicidal.m_KillCount.load() == 1; }));
 }
 
 // Kill never cancels from outside: the library's input and output runs to
@@ -183,9 +176,8 @@ TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
     unsigned char byte = 0;
     reading.Open();
     bytesRead = static_cast<int>(CKRSystem::Read1(input, 1, &byte));   // waits for the pipe
-    krtest::IgnoreCommands(self);
+    IgnoreCommands(self);
   });
-  EXPECT_EQ(reader.GetKillTimeout(), CKRThread::kKillTimeoutSteps);
   reader.SetKillTimeout(1);
   reader.Start();
   ASSERT_TRUE(reading.Wait());
@@ -217,14 +209,14 @@ TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
   flooded.Start();
   std::atomic<bool> flooding{true}, floodEnded{false};
   std::thread flooder([&] {
-    const auto end = std::chrono::steady_clock::now() + krtest::kGenerous;
+    const auto end = std::chrono::steady_clock::now() + kGenerous;
     while (flooding.load() && std::chrono::steady_clock::now() < end) {
       flooded.Pause();
       flooded.Continue();
     }
     floodEnded = true;
   });
-  EXPECT_TRUE(krtest::WaitUntil([&] { return taken.load() > 1000; }));
+  EXPECT_TRUE(WaitUntil([&] { return taken.load() > 1000; }));
   flooded.Kill(9);
   EXPECT_FALSE(floodEnded.load()) << "Kill returned only when the commands stopped";
   flooding = false;
@@ -233,7 +225,7 @@ TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
 }
 
 TEST(CKRThread, GroupMembersExcludeEachOtherAndARunEndingInsideTheLockReleasesIt) {
-  krtest::CDebugRecorder recorder;
+  CDebugRecorder recorder;
   constexpr int kRounds = 2000;
   std::atomic<int> inside{0};
   std::atomic<bool> overlapped{false};
@@ -261,7 +253,7 @@ TEST(CKRThread, GroupMembersExcludeEachOtherAndARunEndingInsideTheLockReleasesIt
   CFunctionThread killed([&](CFunctionThread& self) -> unsigned long {
     self.Lock();
     locked.Open();
-    krtest::IgnoreCommands(self);
+    IgnoreCommands(self);
   });
   CFunctionThread member([&](CFunctionThread&) -> unsigned long { return memberMayEnd.Wait() ? 0 : 1; });
   for (CFunctionThread* thread : {&first, &second, &returning, &killed, &member})
@@ -274,20 +266,17 @@ TEST(CKRThread, GroupMembersExcludeEachOtherAndARunEndingInsideTheLockReleasesIt
   EXPECT_FALSE(overlapped.load());
   EXPECT_EQ(shared, 2LL * kRounds);
 
-  returning.Start();
-  EXPECT_NE(Stopped(returning), kNotStopped);
-  first.Start();
-  EXPECT_NE(Stopped(first), kNotStopped);
+  EXPECT_NE(Ran(returning), kNotStopped);
+  EXPECT_NE(Ran(first), kNotStopped);
   killed.Start();
   ASSERT_TRUE(locked.Wait());
   killed.Kill(1);
-  first.Start();
-  EXPECT_NE(Stopped(first), kNotStopped);
+  EXPECT_NE(Ran(first), kNotStopped);
   EXPECT_EQ(shared, 4LL * kRounds);
   memberMayEnd.Open();
   EXPECT_NE(Stopped(member), kNotStopped);
   // Each thread ending inside the lock reports it, just after its run ended.
-  EXPECT_TRUE(krtest::WaitUntil([&] { return recorder.Texts().size() == 2; }));
+  EXPECT_TRUE(WaitUntil([&] { return recorder.Texts().size() == 2; }));
 }
 
 TEST(CKRThread, TheProcessLockExcludesOtherThreadsWhileItExists) {
@@ -310,7 +299,7 @@ TEST(CKRThread, TheProcessLockExcludesOtherThreadsWhileItExists) {
   CKRThread::ProcessUnlock();
   EXPECT_FALSE(acquired.load()) << "still held once by this thread";
   CKRThread::ProcessUnlock();
-  EXPECT_TRUE(krtest::WaitUntil([&] { return acquired.load(); }));
+  EXPECT_TRUE(WaitUntil([&] { return acquired.load(); }));
   // Closing while another thread holds it: that thread still unlocks.
   CKRThread::CloseProcessLocking();
   mayUnlock.Open();
@@ -348,14 +337,14 @@ private:
 }  // namespace
 
 TEST(CKRThread, DestroyingARunningObjectKillsItsThread) {
-  krtest::CDebugRecorder recorder;
+  CDebugRecorder recorder;
   int channel[2];
   ASSERT_EQ(::pipe(channel), 0);
   std::FILE* input = ::fdopen(channel[0], "rb");
   ASSERT_NE(input, nullptr);
   // Feeds the read once the destructor has reported that it waits for it.
   std::thread feeder([&] {
-    if (krtest::WaitUntil([&] { return recorder.Texts().size() >= 2; })) {
+    if (WaitUntil([&] { return recorder.Texts().size() >= 2; })) {
       EXPECT_EQ(::write(channel[1], "x", 1), 1);
     }
   });
