@@ -4,11 +4,6 @@
 
 namespace {
 
-// A name no other test process uses at the same time.
-CKRString UniqueName(const wchar_t* what) {
-  return CKRString::Formatted(L"krFilesTest-%s-%d-%u", what, int(::getpid()), KRTestSeed());
-}
-
 // Whether a mapping of `name` made on another thread opens at once.
 bool OtherThreadOpens(const CKRString& name, std::size_t size, bool readOnly) {
   bool opened = false;
@@ -104,7 +99,7 @@ TEST(CKRMemMapFile, BadFilesAreRefusedWithNothingHeld) {
 }
 
 TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
-  const CKRString name = UniqueName(L"a/b\\c");
+  const CKRString name = KRUniqueName(L"a/b\\c");
   CKRMemMapFile first, second;
   ASSERT_EQ(first.MapMemory(name.GetString(), 100), 1);
   auto* view = static_cast<char*>(first.Open());
@@ -143,7 +138,7 @@ TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
   EXPECT_EQ(second.MapExistingMemory(name.GetString(), 100), 0);
 
   // A name too long for the system's namespace is shortened alike.
-  const CKRString longName = UniqueName(L"long") + CKRString(1000, L'n');
+  const CKRString longName = KRUniqueName(L"long") + CKRString(1000, L'n');
   ASSERT_EQ(first.MapMemory(longName.GetString(), 8), 1);
   std::memcpy(first.Open(), "long", 5);
   first.Close();
@@ -152,18 +147,16 @@ TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
 
   // Names without an exact UTF-8 form would meet after conversion.
   CKRMemMapFile bad;
-  for (const wchar_t invalid : {wchar_t(0xD800), wchar_t(0xDBFF), wchar_t(0x110000)}) {
-    const CKRString invalidName = UniqueName(L"invalid") + CKRString(1, invalid);
-    EXPECT_EQ(bad.MapMemory(invalidName.GetString(), 8), 0);
-  }
+  for (const wchar_t invalid : {wchar_t(0xD800), wchar_t(0xDBFF), wchar_t(0x110000)})
+    EXPECT_EQ(bad.MapMemory((KRUniqueName(L"invalid") + invalid).GetString(), 8), 0);
   EXPECT_EQ(bad.MapMemory(L"", 8), 0);
   EXPECT_EQ(bad.MapMemory(name.GetString(), 0), 0);
-  EXPECT_EQ(bad.MapExistingMemory(UniqueName(L"never made").GetString(), 8), 0);
+  EXPECT_EQ(bad.MapExistingMemory(KRUniqueName(L"never made").GetString(), 8), 0);
   ExpectEmpty(bad);
 }
 
 TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
-  const CKRString name = UniqueName(L"processes");
+  const CKRString name = KRUniqueName(L"processes");
   CKRMemMapFile parent;
   ASSERT_EQ(parent.MapMemory(name.GetString(), 64), 1);
   auto* text = static_cast<char*>(parent.Open());
@@ -202,7 +195,7 @@ TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
 TEST(CKRMemMapFile, MemoryNotTheUsersOwnIsRefusedAndLeftAlone) {
   if (!KRCanActAsAnotherUser())
     GTEST_SKIP() << "needs root to act as a second user";
-  const CKRString name = UniqueName(L"planted");
+  const CKRString name = KRUniqueName(L"planted");
   const std::vector<std::string> objects = KRSharedObjectsOf(name);   // the block and its lock
   ASSERT_EQ(objects.size(), 2u);
   CKRMemMapFile victim;

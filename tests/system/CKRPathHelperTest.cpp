@@ -30,7 +30,7 @@ TEST(CKRPathHelper, TextOperationsSplitAtTheLastSeparator) {
   EXPECT_EQ(CKRPathHelper::AddSlash(nullptr), L"");
 }
 
-TEST(CKRPathHelper, ExistenceFollowsLinksAndRefusesBadPaths) {
+TEST(CKRPathHelper, ExistenceAndCreatePathFollowLinksAndRefuseBadPaths) {
   CKRFilesScratch scratch;
   scratch.Make({"file", "folder/"});
   scratch.MakePipe("pipe");
@@ -57,7 +57,7 @@ TEST(CKRPathHelper, ExistenceFollowsLinksAndRefusesBadPaths) {
   }
   EXPECT_FALSE(CKRPathHelper::FileExists(nullptr) || CKRPathHelper::DirectoryExists(nullptr));
   if (!KRCanActAsAnotherUser()) {
-    scratch.MakeFolder("closed");
+    scratch.Make({"closed/"});
     ::chmod(scratch.Native("closed").c_str(), 0600);
     EXPECT_FALSE(CKRPathHelper::DirectoryExists(scratch.Wide("closed").GetString())) << "cannot be entered";
   }
@@ -66,6 +66,22 @@ TEST(CKRPathHelper, ExistenceFollowsLinksAndRefusesBadPaths) {
             scratch.Wide("folder/doc.txt"));
   EXPECT_EQ(CKRPathHelper::BuildCompletePath(scratch.Wide("missing").GetString(), L"/elsewhere/doc.txt"),
             L"/elsewhere/doc.txt");
+
+  // CreatePath makes every missing level, never through a link.
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c").GetString()), 1);
+  EXPECT_TRUE(CKRPathHelper::DirectoryExists(scratch.Wide("a/b/c").GetString()));
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c/").GetString()), 1) << "exists: nothing to do";
+
+  errno = 0;
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file").GetString()), 0);
+  EXPECT_EQ(errno, EEXIST);
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file/below").GetString()), 0);
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling").GetString()), 0);
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling/below").GetString()), 0);
+  EXPECT_NE(::access(scratch.Native("gone").c_str(), F_OK), 0) << "nothing made through the link";
+
+  EXPECT_EQ(CKRPathHelper::CreatePath(nullptr), 0);
+  EXPECT_EQ(CKRPathHelper::CreatePath((scratch.Wide("") + L"/" + CKRString(5000, L'n')).GetString()), 0);
 }
 
 TEST(CKRPathHelper, DirectoryTestsLeaveTheCurrentDirectoryAlone) {
@@ -84,30 +100,10 @@ TEST(CKRPathHelper, DirectoryTestsLeaveTheCurrentDirectoryAlone) {
   EXPECT_EQ(::getcwd(buffer, sizeof buffer), nullptr) << "still in the removed directory";
 
   // A name that is not UTF-8 has no exact wide form: no current directory.
-  scratch.MakeFolder("bad\xFF");
+  scratch.Make({"bad\xFF/"});
   ASSERT_EQ(::chdir(scratch.Native("bad\xFF").c_str()), 0);
   EXPECT_EQ(CKRPathHelper::GetCurrentWorkingDirectory(), L"");
   std::filesystem::current_path(before);
-}
-
-TEST(CKRPathHelper, CreatePathMakesEveryMissingLevel) {
-  CKRFilesScratch scratch;
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c").GetString()), 1);
-  EXPECT_TRUE(CKRPathHelper::DirectoryExists(scratch.Wide("a/b/c").GetString()));
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c/").GetString()), 1) << "exists: nothing to do";
-
-  scratch.WriteFile("file", "x");
-  errno = 0;
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file").GetString()), 0);
-  EXPECT_EQ(errno, EEXIST);
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file/below").GetString()), 0);
-  scratch.MakeLink(scratch.Native("gone"), "dangling");
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling").GetString()), 0);
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling/below").GetString()), 0);
-  EXPECT_NE(::access(scratch.Native("gone").c_str(), F_OK), 0) << "nothing made through the link";
-
-  EXPECT_EQ(CKRPathHelper::CreatePath(nullptr), 0);
-  EXPECT_EQ(CKRPathHelper::CreatePath((scratch.Wide("") + L"/" + CKRString(5000, L'n')).GetString()), 0);
 }
 
 TEST(CKRPathHelper, RemoveDirectoryRemovesTheTreeAndNothingOutside) {

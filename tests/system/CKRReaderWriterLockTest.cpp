@@ -25,15 +25,11 @@ TYPED_TEST_SUITE(CKRReaderWriterLockTest, KRLockTypes);
 // too, and a second writer still goes before them.
 TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
   TypeParam lock;
-  std::mutex logMutex;
-  std::string log;
+  CRecords<char> log;
   auto logged = [&](bool write) {
     return [&, write] {
       write ? lock.AcquireWriterLock() : lock.AcquireReaderLock();
-      {
-        std::lock_guard<std::mutex> guard(logMutex);
-        log += write ? "W" : "R";
-      }
+      log.Add(write ? 'W' : 'R');
       write ? lock.ReleaseWriterLock() : lock.ReleaseReaderLock();
     };
   };
@@ -48,7 +44,7 @@ TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
 
   ASSERT_TRUE(firstReader.Do([&] { lock.ReleaseReaderLock(); }));
   EXPECT_TRUE(firstWritten->Wait() && secondWritten->Wait() && secondRead->Wait());
-  EXPECT_EQ(log, "WWR");
+  EXPECT_EQ(log.WaitFor(), (std::vector<char>{'W', 'W', 'R'}));
   ExpectFree(lock);
 }
 

@@ -43,10 +43,6 @@ private:
   std::vector<std::optional<std::string>> m_Saved;
 };
 
-CKRString UniqueID(const wchar_t* what) {
-  return CKRString::Formatted(L"krFilesTestApp-%s-%d-%u", what, int(::getpid()), KRTestSeed());
-}
-
 // What a second instance, in a child process started in `folder`, finds:
 // kNotDetected, or what became of its file (_EKRHandOver).
 constexpr int kNotDetected = -1;
@@ -68,9 +64,9 @@ using CKRRequests = krtest::CRecords<CKRString>;
 
 }  // namespace
 
-TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
+TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstWhileItLivesAndHandsItAFile) {
   CKRScratchRuntime scratch;
-  const CKRString id = UniqueID(L"handover");
+  const CKRString id = KRUniqueName(L"handover");
   _EKRHandOver handOver = KRHANDOVER_FAILED;
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr, &handOver)) << "the first";
   EXPECT_EQ(handOver, KRHANDOVER_NONE);
@@ -86,7 +82,7 @@ TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
 
   // Started in another folder with a relative name; then an absolute name,
   // one that is not UTF-8 (not handed over, as it cannot be exactly), none.
-  scratch.MakeFolder("elsewhere");
+  scratch.Make({"elsewhere/"});
   EXPECT_EQ(DetectInChild(id, {"-n", "docs/plan \xC3\xA9.txt", "second.txt"}, scratch.Native("elsewhere")),
             KRHANDOVER_DELIVERED);
   EXPECT_EQ(DetectInChild(id, {"/data/model.kr"}), KRHANDOVER_DELIVERED);
@@ -100,13 +96,22 @@ TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
   EXPECT_FALSE(listener.IsRunning());
   EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE) << "still running, though no longer listening";
   EXPECT_EQ(DetectInChild(id, {"/data/model.kr"}), KRHANDOVER_FAILED);
+
+  // The lock ends with its process; separators and a length beyond a socket
+  // address still make one instance.
+  const CKRString other = KRUniqueName(L"a/b\\c") + CKRString(300, L'x');
+  EXPECT_EQ(DetectInChild(other), kNotDetected) << "a first instance that ends";
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(other.GetString(), 0, nullptr)) << "free again";
+  EXPECT_EQ(DetectInChild(other), KRHANDOVER_NONE);
+  // Only the holder of the lock may listen.
+  EXPECT_EQ(KRRunInChild([&] { return CKRSingleAppInstanceListener().Start(other.GetString(), nullptr, nullptr); }), 0);
 }
 
 // Fifty instances started at once, while four connections that never say
 // anything are held open: every file name arrives.
 TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
   CKRScratchRuntime scratch;
-  const CKRString id = UniqueID(L"many");
+  const CKRString id = KRUniqueName(L"many");
   CKRRequests requests;
   CKRSingleAppInstanceListener listener;
   ASSERT_TRUE(listener.Start(id.GetString(), nullptr, [&](const CKRString& file) { requests.Add(file); }));
@@ -155,20 +160,6 @@ TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
     ::close(fd);
 }
 
-TEST(CKRSingleAppInstance, TheLockEndsWithItsProcess) {
-  CKRScratchRuntime scratch;
-  // Separators and a length beyond a socket address: still one instance.
-  const CKRString id = UniqueID(L"a/b\\c") + CKRString(300, L'x');
-  EXPECT_EQ(DetectInChild(id), kNotDetected) << "a first instance that ends";
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr)) << "free again";
-  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
-  EXPECT_EQ(KRRunInChild([&] {   // only the holder of the lock may listen
-              CKRSingleAppInstanceListener listener;
-              return listener.Start(id.GetString(), nullptr, nullptr) ? 1 : 0;
-            }),
-            0);
-}
-
 TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   CKRScratchRuntime scratch;
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(nullptr, 0, nullptr));
@@ -179,7 +170,7 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   // Without a runtime folder of its own the user gets a private one in the
   // temporary folder ...
   ::unsetenv("XDG_RUNTIME_DIR");
-  const CKRString id = UniqueID(L"fallback");
+  const CKRString id = KRUniqueName(L"fallback");
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr));
   EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
   struct stat info {};
@@ -190,12 +181,12 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   // or one open to others (one of another user: next test).
   const std::string unsafe = scratch.UseOtherTemporaryFolder();
   scratch.MakeLink(scratch.Native("run"), unsafe);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"unsafe").GetString(), 0, nullptr));
-  EXPECT_FALSE(listener.Start(UniqueID(L"unsafe").GetString(), nullptr, nullptr));
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"unsafe").GetString(), 0, nullptr));
+  EXPECT_FALSE(listener.Start(KRUniqueName(L"unsafe").GetString(), nullptr, nullptr));
   ::unlink(scratch.Native(unsafe).c_str());
-  scratch.MakeFolder(unsafe);
+  scratch.Make({unsafe + "/"});
   ::chmod(scratch.Native(unsafe).c_str(), 0770);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"open").GetString(), 0, nullptr));
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"open").GetString(), 0, nullptr));
 }
 
 // What another user owns is never used: shared memory planted under the
@@ -206,7 +197,7 @@ TEST(CKRSingleAppInstance, WhatAnotherUserOwnsIsNotUsed) {
   if (!KRCanActAsAnotherUser())
     GTEST_SKIP() << "needs root to act as a second user";
   CKRScratchRuntime scratch;
-  const CKRString id = UniqueID(L"planted");
+  const CKRString id = KRUniqueName(L"planted id");
   const std::vector<std::string> objects = KRSharedObjectsOf(id);   // the block and its lock
   ASSERT_EQ(objects.size(), 2u);
   {
@@ -225,10 +216,10 @@ TEST(CKRSingleAppInstance, WhatAnotherUserOwnsIsNotUsed) {
   const std::string unsafe = scratch.UseOtherTemporaryFolder();
   ::mkdir(scratch.Native(unsafe).c_str(), 0700);
   ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), kKRAnotherUser, kKRAnotherUser), 0);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"other's").GetString(), 0, nullptr));
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"other's").GetString(), 0, nullptr));
   ASSERT_EQ(::chown(scratch.Native("run").c_str(), kKRAnotherUser, kKRAnotherUser), 0);
   ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
   ::setenv("TMPDIR", scratch.Native().c_str(), 1);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"passed over").GetString(), 0, nullptr));
-  EXPECT_EQ(DetectInChild(UniqueID(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"passed over").GetString(), 0, nullptr));
+  EXPECT_EQ(DetectInChild(KRUniqueName(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
 }

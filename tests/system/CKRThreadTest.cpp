@@ -52,7 +52,7 @@ TEST(CKRThread, RunsItsHandlerAndStartsAgainAfterItEnded) {
   }
 }
 
-TEST(CKRThread, RepeatedCommandsAreQueuedOnceAndImmediateOnesGoFirst) {
+TEST(CKRThread, CommandsQueueOnceAndStopNeverWaitsOnItsOwnThread) {
   CGate posted;
   std::vector<int> received;
   CFunctionThread thread([&](CFunctionThread& self) -> unsigned long {
@@ -77,9 +77,8 @@ TEST(CKRThread, RepeatedCommandsAreQueuedOnceAndImmediateOnesGoFirst) {
     received.pop_back();
   EXPECT_EQ(received, (std::vector<int>{KRTHREAD_CMD_RESET, KRTHREAD_CMD_STARTED, KRTHREAD_CMD_PAUSE,
                                         KRTHREAD_CMD_CONTINUE, KRTHREAD_CMD_RUN, KRTHREAD_CMD_RESET}));
-}
 
-TEST(CKRThread, StopEndsAHandlerThatReactsAndNeverWaitsOnItsOwnThread) {
+  // Stop ends a handler that reacts to it.
   CFunctionThread reacting([](CFunctionThread& self) -> unsigned long {
     for (int command = KRTHREAD_CMD_NONE; command != KRTHREAD_CMD_STOP;)
       self.WaitForNotification(command, KRTHREAD_INFINITE);
@@ -162,10 +161,40 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
   EXPECT_TRUE(WaitUntil([&] { return suicidal.m_KillCount.load() == 1; }));
 }
 
+namespace {
+
+// A thread class without a destructor of its own: the base's destructor
+// deals with a thread still running. The handler takes what it needs
+// before it lets the test go on to destroy the object, then reads a pipe
+// (not a kill point) and waits for commands (one).
+class CBareThread : public CKRThread {
+public:
+  CBareThread(CGate& entered, std::FILE* input) : m_Entered(entered), m_pInput(input) {
+    SetUsesNotification(1);
+    SetKillTimeout(1);
+  }
+
+protected:
+  unsigned long ThreadHandler() override {
+    std::FILE* input = m_pInput;
+    m_Entered.Open();
+    unsigned char byte = 0;
+    CKRSystem::Read1(input, 1, &byte);
+    for (int command = KRTHREAD_CMD_NONE;;)
+      WaitForNotification(command, KRTHREAD_INFINITE);
+  }
+
+private:
+  CGate& m_Entered;
+  std::FILE* m_pInput;
+};
+
+}  // namespace
+
 // Kill never cancels from outside: the library's input and output runs to
 // its end, and a thread inside it that does not come out in time is
 // reported, the process going on.
-TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
+TEST(CKRThread, KillAndDestructionAreBoundedAndNeverEndTheProcess) {
   int channel[2];
   ASSERT_EQ(::pipe(channel), 0);
   std::FILE* input = ::fdopen(channel[0], "rb");
@@ -197,6 +226,26 @@ TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
   EXPECT_EQ(Stopped(reader), 5u);
   EXPECT_EQ(bytesRead.load(), 1) << "the read ran to its end";
   EXPECT_EQ(reader.m_KillCount.load(), 0);
+
+  // Destroying a running object whose class has no destructor of its own
+  // reports the kill that failed and waits for the read to end.
+  CDebugRecorder recorder;
+  // Feeds the read once the destructor has reported that it waits for it.
+  std::thread feeder([&] {
+    EXPECT_TRUE(WaitUntil([&] { return recorder.Texts().size() >= 2; }) && ::write(channel[1], "x", 1) == 1);
+  });
+  CGate entered;
+  {
+    CBareThread running(entered, input);
+    running.SetSynchronicity(1, L"destroyed");
+    running.Start();
+    EXPECT_TRUE(entered.Wait());
+  }
+  feeder.join();
+  const std::vector<std::wstring> texts = recorder.Texts();
+  ASSERT_EQ(texts.size(), 2u);
+  EXPECT_NE(texts[0].find(L"killed"), std::wstring::npos);
+  EXPECT_NE(texts[1].find(L"waiting for it to end"), std::wstring::npos);
   std::fclose(input);
   ::close(channel[1]);
 
@@ -304,62 +353,4 @@ TEST(CKRThread, TheProcessLockExcludesOtherThreadsWhileItExists) {
   CKRThread::CloseProcessLocking();
   mayUnlock.Open();
   EXPECT_NE(Stopped(other), kNotStopped);
-}
-
-namespace {
-
-// A thread class without a destructor of its own: the base's destructor
-// deals with a thread still running. The handler takes what it needs
-// before it lets the test go on to destroy the object, then reads a pipe
-// (not a kill point) and waits for commands (one).
-class CBareThread : public CKRThread {
-public:
-  CBareThread(CGate& entered, std::FILE* input) : m_Entered(entered), m_pInput(input) {
-    SetUsesNotification(1);
-    SetKillTimeout(1);
-  }
-
-protected:
-  unsigned long ThreadHandler() override {
-    std::FILE* input = m_pInput;
-    m_Entered.Open();
-    unsigned char byte = 0;
-    CKRSystem::Read1(input, 1, &byte);
-    for (int command = KRTHREAD_CMD_NONE;;)
-      WaitForNotification(command, KRTHREAD_INFINITE);
-  }
-
-private:
-  CGate& m_Entered;
-  std::FILE* m_pInput;
-};
-
-}  // namespace
-
-TEST(CKRThread, DestroyingARunningObjectKillsItsThread) {
-  CDebugRecorder recorder;
-  int channel[2];
-  ASSERT_EQ(::pipe(channel), 0);
-  std::FILE* input = ::fdopen(channel[0], "rb");
-  ASSERT_NE(input, nullptr);
-  // Feeds the read once the destructor has reported that it waits for it.
-  std::thread feeder([&] {
-    if (WaitUntil([&] { return recorder.Texts().size() >= 2; })) {
-      EXPECT_EQ(::write(channel[1], "x", 1), 1);
-    }
-  });
-  CGate entered;
-  {
-    CBareThread running(entered, input);
-    running.SetSynchronicity(1, L"destroyed");
-    running.Start();
-    EXPECT_TRUE(entered.Wait());
-  }
-  feeder.join();
-  const std::vector<std::wstring> texts = recorder.Texts();
-  ASSERT_EQ(texts.size(), 2u);
-  EXPECT_NE(texts[0].find(L"killed"), std::wstring::npos);
-  EXPECT_NE(texts[1].find(L"waiting for it to end"), std::wstring::npos);
-  std::fclose(input);
-  ::close(channel[1]);
 }

@@ -45,7 +45,6 @@ public:
     ASSERT_EQ(::write(fd, content.data(), content.size()), ssize_t(content.size()));
     ::close(fd);
   }
-  void MakeFolder(const std::string& name) const { ASSERT_EQ(::mkdir(Native(name).c_str(), 0755), 0) << name; }
   void MakeLink(const std::string& target, const std::string& name) const {
     ASSERT_EQ(::symlink(target.c_str(), Native(name).c_str()), 0) << name;
   }
@@ -68,7 +67,7 @@ public:
 
 // Paths every file service must refuse, made inside `scratch`.
 inline std::vector<std::pair<const char*, CKRString>> KRBadPaths(const CKRFilesScratch& scratch) {
-  scratch.MakeFolder("bad-folder");
+  scratch.Make({"bad-folder/"});
   scratch.MakePipe("bad-pipe");
   scratch.MakeLink(scratch.Native("bad-gone"), "bad-dangling");
   return {{"empty", CKRString()},
@@ -78,6 +77,11 @@ inline std::vector<std::pair<const char*, CKRString>> KRBadPaths(const CKRFilesS
           {"directory", scratch.Wide("bad-folder")},
           {"pipe without a writer", scratch.Wide("bad-pipe")},
           {"dangling link", scratch.Wide("bad-dangling")}};
+}
+
+// A name no other test process uses at the same time.
+inline CKRString KRUniqueName(const wchar_t* what) {
+  return CKRString::Formatted(L"krFilesTest-%s-%d-%u", what, int(::getpid()), KRTestSeed());
 }
 
 // A file's content through CKRSystem::Load.
@@ -93,7 +97,8 @@ inline std::string KRLoadText(const CKRString& path) {
 
 // Number of open descriptors of this process (with the one that lists them).
 inline int KROpenDescriptorCount() {
-  return int(std::distance(std::filesystem::directory_iterator("/proc/self/fd"), std::filesystem::directory_iterator()));
+  using std::filesystem::directory_iterator;
+  return int(std::distance(directory_iterator("/proc/self/fd"), directory_iterator()));
 }
 
 // Starts `body` in a forked child that ends with _exit(body()); -1 on failure.
