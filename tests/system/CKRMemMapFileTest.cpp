@@ -24,7 +24,7 @@ void ExpectEmpty(CKRMemMapFile& map) {
 
 }  // namespace
 
-TEST(CKRMemMapFile, WritesThroughAFileMappingReachTheFileButTheTerminatorNever) {
+TEST(CKRMemMapFile, FileMappingsWriteThroughKeepTheSizeAndRefuseBadFiles) {
   EXPECT_EQ(CKRMemMapFile::MakeMappingName(L"/home/u\\Doc.txt"), L"_HOME_U_DOC.TXT");
   CKRFilesScratch scratch;
   scratch.WriteFile("data.bin", "hello, world");
@@ -71,25 +71,21 @@ TEST(CKRMemMapFile, WritesThroughAFileMappingReachTheFileButTheTerminatorNever) 
       EXPECT_EQ(KRLoadText(scratch.Wide("text")), content) << "the file keeps its size";
     }
   }
-}
 
-TEST(CKRMemMapFile, BadFilesAreRefusedWithNothingHeld) {
-  CKRFilesScratch scratch;
+  // Bad files are refused with nothing held.
   scratch.WriteFile("empty", "");
-  scratch.WriteFile("good", "good");
   scratch.MakeSparse("huge", off_t(1) << 32);
   std::vector<std::pair<const char*, CKRString>> cases = KRBadPaths(scratch);
   cases.push_back({"empty file", scratch.Wide("empty")});
   cases.push_back({"device", CKRString(L"/dev/zero")});
   cases.push_back({"4 GiB", scratch.Wide("huge")});
   const int descriptors = KROpenDescriptorCount();
-  CKRMemMapFile map;
-  for (const auto& [what, path] : cases) {
+  for (const auto& [what, bad] : cases) {
     SCOPED_TRACE(what);
     for (const bool readOnly : {true, false}) {
       // Each attempt first lets go of a good mapping.
-      ASSERT_EQ(map.MapFile(scratch.Wide("good").GetString(), readOnly), 1);
-      EXPECT_EQ(map.MapFile(path.GetString(), readOnly, 0, true), 0);
+      ASSERT_EQ(map.MapFile(path.GetString(), readOnly), 1);
+      EXPECT_EQ(map.MapFile(bad.GetString(), readOnly, 0, true), 0);
       ExpectEmpty(map);
     }
   }
@@ -98,7 +94,7 @@ TEST(CKRMemMapFile, BadFilesAreRefusedWithNothingHeld) {
   EXPECT_EQ(KROpenDescriptorCount(), descriptors) << "no descriptor is left open";
 }
 
-TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
+TEST(CKRMemMapFile, NamedMemoryIsSharedAcrossThreadsAndProcessesWhileMapped) {
   const CKRString name = KRUniqueName(L"a/b\\c");
   CKRMemMapFile first, second;
   ASSERT_EQ(first.MapMemory(name.GetString(), 100), 1);
@@ -153,12 +149,11 @@ TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
   EXPECT_EQ(bad.MapMemory(name.GetString(), 0), 0);
   EXPECT_EQ(bad.MapExistingMemory(KRUniqueName(L"never made").GetString(), 8), 0);
   ExpectEmpty(bad);
-}
 
-TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
-  const CKRString name = KRUniqueName(L"processes");
+  // Two processes share named memory under the lock.
+  const CKRString between = KRUniqueName(L"processes");
   CKRMemMapFile parent;
-  ASSERT_EQ(parent.MapMemory(name.GetString(), 64), 1);
+  ASSERT_EQ(parent.MapMemory(between.GetString(), 64), 1);
   auto* text = static_cast<char*>(parent.Open());
   ASSERT_NE(text, nullptr);
   std::strcpy(text, "from the parent");
@@ -166,7 +161,7 @@ TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
   ASSERT_EQ(::pipe(turns), 0);
   const pid_t child = KRStartChild([&] {
     CKRMemMapFile mine;
-    if (mine.MapExistingMemory(name.GetString(), 64) != 1)
+    if (mine.MapExistingMemory(between.GetString(), 64) != 1)
       return 1;
     if (mine.Open(0) != nullptr || ::write(turns[1], "!", 1) != 1)
       return 2;   // the parent holds the lock

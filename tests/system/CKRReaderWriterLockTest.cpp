@@ -23,7 +23,7 @@ TYPED_TEST_SUITE(CKRReaderWriterLockTest, KRLockTypes);
 
 // A writer waits for a reader; readers arriving behind a waiting writer wait
 // too, and a second writer still goes before them.
-TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
+TYPED_TEST(CKRReaderWriterLockTest, PrefersWritersAndIgnoresReleasesOfWhatIsNotHeld) {
   TypeParam lock;
   CRecords<char> log;
   auto logged = [&](bool write) {
@@ -46,14 +46,10 @@ TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
   EXPECT_TRUE(firstWritten->Wait() && secondWritten->Wait() && secondRead->Wait());
   EXPECT_EQ(log.WaitFor(), (std::vector<char>{'W', 'W', 'R'}));
   ExpectFree(lock);
-}
 
-// Releasing what the thread does not hold changes nothing and is reported.
-TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
+  // Releasing what the thread does not hold changes nothing and is reported.
   CDebugRecorder recorder;
-  TypeParam lock;
-  CActor reader, writer;
-  ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
+  ASSERT_TRUE(firstReader.Do([&] { lock.AcquireReaderLock(); }));
   lock.ReleaseReaderLock();
   lock.ReleaseWriterLock();
   EXPECT_EQ(lock.GetReaderCount(), 1);
@@ -62,19 +58,19 @@ TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
 
   // Had the count dropped, this writer would get in while the reader reads.
   std::atomic<bool> written{false};
-  const auto writing = writer.Post([&] {
+  const auto writing = firstWriter.Post([&] {
     lock.AcquireWriterLock();
     written = true;
   });
   ASSERT_TRUE(WaitUntil([&] { return lock.GetWriterCount() == 1; }));
   lock.ReleaseReaderLock();
   EXPECT_FALSE(written.load());
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseReaderLock(); }));
+  ASSERT_TRUE(firstReader.Do([&] { lock.ReleaseReaderLock(); }));
   ASSERT_TRUE(writing->Wait());
 
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseWriterLock(); }));   // nor another thread's write lock
+  ASSERT_TRUE(firstReader.Do([&] { lock.ReleaseWriterLock(); }));   // nor another thread's write lock
   EXPECT_EQ(lock.GetWriterCount(), 1);
-  ASSERT_TRUE(writer.Do([&] { lock.ReleaseWriterLock(); }));
+  ASSERT_TRUE(firstWriter.Do([&] { lock.ReleaseWriterLock(); }));
   EXPECT_EQ(recorder.Texts().size(), 4u);
   ExpectFree(lock);
 }

@@ -117,8 +117,7 @@ TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
   ASSERT_TRUE(listener.Start(id.GetString(), nullptr, [&](const CKRString& file) { requests.Add(file); }));
 
   const std::string socketPath = scratch.Native("run/krCoreLib-") + id.ToUtf8() + "-test.sock";
-  sockaddr_un address {};
-  address.sun_family = AF_UNIX;
+  sockaddr_un address{AF_UNIX, {}};
   ASSERT_LT(socketPath.size(), sizeof address.sun_path);
   std::memcpy(address.sun_path, socketPath.c_str(), socketPath.size() + 1);
   std::vector<int> silent;

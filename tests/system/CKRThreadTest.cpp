@@ -4,7 +4,6 @@
 
 #include "KRThreadTestSupport.h"
 
-#include <cstdio>
 #include <unistd.h>
 
 using namespace krtest;
@@ -100,7 +99,33 @@ TEST(CKRThread, CommandsQueueOnceAndStopNeverWaitsOnItsOwnThread) {
   EXPECT_EQ(ownStop.load(), 0);
 }
 
-TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
+TEST(CKRThread, TheProcessLockExcludesAndKillEndsAThreadAtEachKillPoint) {
+  // The process lock excludes other threads while it exists.
+  CKRThread::ProcessUnlock();   // closed, and held by nobody: ignored
+  CKRThread::OpenProcessLocking();
+  CKRThread::OpenProcessLocking();   // once is enough
+  CKRThread::ProcessLock();
+  CKRThread::ProcessLock();
+  std::atomic<bool> acquired{false};
+  CGate mayUnlock;
+  CFunctionThread other([&](CFunctionThread&) -> unsigned long {
+    CKRThread::ProcessUnlock();   // not held by this thread: ignored
+    CKRThread::ProcessLock();
+    acquired = true;
+    EXPECT_TRUE(mayUnlock.Wait());
+    CKRThread::ProcessUnlock();
+    return 0;
+  });
+  other.Start();
+  CKRThread::ProcessUnlock();
+  EXPECT_FALSE(acquired.load()) << "still held once by this thread";
+  CKRThread::ProcessUnlock();
+  EXPECT_TRUE(WaitUntil([&] { return acquired.load(); }));
+  // Closing while another thread holds it: that thread still unlocks.
+  CKRThread::CloseProcessLocking();
+  mayUnlock.Open();
+  EXPECT_NE(Stopped(other), kNotStopped);
+
   // The test thread holds the process lock throughout, so that taking it
   // waits (groups wait alike).
   CKRThread::OpenProcessLocking();
@@ -326,31 +351,4 @@ TEST(CKRThread, GroupMembersExcludeEachOtherAndARunEndingInsideTheLockReleasesIt
   EXPECT_NE(Stopped(member), kNotStopped);
   // Each thread ending inside the lock reports it, just after its run ended.
   EXPECT_TRUE(WaitUntil([&] { return recorder.Texts().size() == 2; }));
-}
-
-TEST(CKRThread, TheProcessLockExcludesOtherThreadsWhileItExists) {
-  CKRThread::ProcessUnlock();   // closed, and held by nobody: ignored
-  CKRThread::OpenProcessLocking();
-  CKRThread::OpenProcessLocking();   // once is enough
-  CKRThread::ProcessLock();
-  CKRThread::ProcessLock();
-  std::atomic<bool> acquired{false};
-  CGate mayUnlock;
-  CFunctionThread other([&](CFunctionThread&) -> unsigned long {
-    CKRThread::ProcessUnlock();   // not held by this thread: ignored
-    CKRThread::ProcessLock();
-    acquired = true;
-    EXPECT_TRUE(mayUnlock.Wait());
-    CKRThread::ProcessUnlock();
-    return 0;
-  });
-  other.Start();
-  CKRThread::ProcessUnlock();
-  EXPECT_FALSE(acquired.load()) << "still held once by this thread";
-  CKRThread::ProcessUnlock();
-  EXPECT_TRUE(WaitUntil([&] { return acquired.load(); }));
-  // Closing while another thread holds it: that thread still unlocks.
-  CKRThread::CloseProcessLocking();
-  mayUnlock.Open();
-  EXPECT_NE(Stopped(other), kNotStopped);
 }

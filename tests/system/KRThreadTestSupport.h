@@ -1,5 +1,6 @@
 // What the thread and lock tests share: bounded waits on conditions, gates,
-// helper threads that run steps on request, and a recorder of debug output.
+// helper threads that run steps on request, records of what other threads
+// report (debug output among them).
 // Every wait is for a condition, with a limit that fails the test instead
 // of hanging it.
 #pragma once
