@@ -21,8 +21,14 @@ public:
     m_Root = pattern;
   }
   ~CKRScratchFolder() {
-    std::error_code error;  // a test may have taken the folder's permissions away
+    std::error_code error;  // a test may have taken folders' permissions away: give them back
     std::filesystem::permissions(m_Root, std::filesystem::perms::owner_all, error);
+    for (auto it = std::filesystem::recursive_directory_iterator(m_Root, error);
+         !error && it != std::filesystem::recursive_directory_iterator(); it.increment(error)) {
+      if (it->is_directory(error) && !it->is_symlink(error))
+        std::filesystem::permissions(it->path(), std::filesystem::perms::owner_all,
+                                     std::filesystem::perm_options::add, error);
+    }
     std::filesystem::remove_all(m_Root, error);
   }
   CKRScratchFolder(const CKRScratchFolder&) = delete;

@@ -4,11 +4,6 @@
 
 namespace {
 
-// A name no other test process uses at the same time.
-CKRString UniqueName(const wchar_t* what) {
-  return CKRString::Formatted(L"krFilesTest-%s-%d-%u", what, int(::getpid()), KRTestSeed());
-}
-
 // Whether a mapping of `name` made on another thread opens at once.
 bool OtherThreadOpens(const CKRString& name, std::size_t size, bool readOnly) {
   bool opened = false;
@@ -29,7 +24,7 @@ void ExpectEmpty(CKRMemMapFile& map) {
 
 }  // namespace
 
-TEST(CKRMemMapFile, WritesThroughAFileMappingReachTheFile) {
+TEST(CKRMemMapFile, FileMappingsWriteThroughKeepTheSizeAndRefuseBadFiles) {
   EXPECT_EQ(CKRMemMapFile::MakeMappingName(L"/home/u\\Doc.txt"), L"_HOME_U_DOC.TXT");
   CKRFilesScratch scratch;
   scratch.WriteFile("data.bin", "hello, world");
@@ -58,46 +53,39 @@ TEST(CKRMemMapFile, WritesThroughAFileMappingReachTheFile) {
   char first = 0;
   EXPECT_EQ(::pread(fd, &first, 1, 0), 1) << "still open";
   ::close(fd);
-}
 
-TEST(CKRMemMapFile, TerminatorFollowsTheDataButNeverReachesTheFile) {
-  CKRFilesScratch scratch;
-  // At a page's end the terminator needs a page of its own.
+  // A terminator follows the data but never reaches the file; at a page's
+  // end it needs a page of its own.
   for (const std::size_t size : {std::size_t(10), std::size_t(4096), std::size_t(8190)}) {
     for (const bool readOnly : {false, true}) {
       SCOPED_TRACE(testing::Message() << size << (readOnly ? " read-only" : " read-write"));
       const std::string content(size, 'x');
       scratch.WriteFile("text", content);
-      CKRMemMapFile map;
       ASSERT_EQ(map.MapFile(scratch.Wide("text").GetString(), readOnly, 0, true), 1);
-      const auto* view = static_cast<const unsigned char*>(map.Open(1000));
-      ASSERT_NE(view, nullptr);
+      const auto* text = static_cast<const unsigned char*>(map.Open(1000));
+      ASSERT_NE(text, nullptr);
       EXPECT_EQ(map.GetSize(), size);
-      EXPECT_EQ(view[size - 1], 'x');
-      EXPECT_EQ(view[size] | view[size + 1], 0);
+      EXPECT_EQ(text[size - 1], 'x');
+      EXPECT_EQ(text[size] | text[size + 1], 0);
       map.UnMap();
       EXPECT_EQ(KRLoadText(scratch.Wide("text")), content) << "the file keeps its size";
     }
   }
-}
 
-TEST(CKRMemMapFile, BadFilesAreRefusedWithNothingHeld) {
-  CKRFilesScratch scratch;
+  // Bad files are refused with nothing held.
   scratch.WriteFile("empty", "");
-  scratch.WriteFile("good", "good");
   scratch.MakeSparse("huge", off_t(1) << 32);
   std::vector<std::pair<const char*, CKRString>> cases = KRBadPaths(scratch);
   cases.push_back({"empty file", scratch.Wide("empty")});
   cases.push_back({"device", CKRString(L"/dev/zero")});
   cases.push_back({"4 GiB", scratch.Wide("huge")});
   const int descriptors = KROpenDescriptorCount();
-  CKRMemMapFile map;
-  for (const auto& [what, path] : cases) {
+  for (const auto& [what, bad] : cases) {
     SCOPED_TRACE(what);
     for (const bool readOnly : {true, false}) {
       // Each attempt first lets go of a good mapping.
-      ASSERT_EQ(map.MapFile(scratch.Wide("good").GetString(), readOnly), 1);
-      EXPECT_EQ(map.MapFile(path.GetString(), readOnly, 0, true), 0);
+      ASSERT_EQ(map.MapFile(path.GetString(), readOnly), 1);
+      EXPECT_EQ(map.MapFile(bad.GetString(), readOnly, 0, true), 0);
       ExpectEmpty(map);
     }
   }
@@ -106,8 +94,8 @@ TEST(CKRMemMapFile, BadFilesAreRefusedWithNothingHeld) {
   EXPECT_EQ(KROpenDescriptorCount(), descriptors) << "no descriptor is left open";
 }
 
-TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
-  const CKRString name = UniqueName(L"a/b\\c");
+TEST(CKRMemMapFile, NamedMemoryIsSharedAcrossThreadsAndProcessesWhileMapped) {
+  const CKRString name = KRUniqueName(L"a/b\\c");
   CKRMemMapFile first, second;
   ASSERT_EQ(first.MapMemory(name.GetString(), 100), 1);
   auto* view = static_cast<char*>(first.Open());
@@ -146,7 +134,7 @@ TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
   EXPECT_EQ(second.MapExistingMemory(name.GetString(), 100), 0);
 
   // A name too long for the system's namespace is shortened alike.
-  const CKRString longName = UniqueName(L"long") + CKRString(1000, L'n');
+  const CKRString longName = KRUniqueName(L"long") + CKRString(1000, L'n');
   ASSERT_EQ(first.MapMemory(longName.GetString(), 8), 1);
   std::memcpy(first.Open(), "long", 5);
   first.Close();
@@ -155,20 +143,17 @@ TEST(CKRMemMapFile, NamedMemoryIsSharedAndLivesWhileMapped) {
 
   // Names without an exact UTF-8 form would meet after conversion.
   CKRMemMapFile bad;
-  for (const wchar_t invalid : {wchar_t(0xD800), wchar_t(0xDBFF), wchar_t(0x110000)}) {
-    const CKRString invalidName = UniqueName(L"invalid") + CKRString(1, invalid);
-    EXPECT_EQ(bad.MapMemory(invalidName.GetString(), 8), 0);
-  }
+  for (const wchar_t invalid : {wchar_t(0xD800), wchar_t(0xDBFF), wchar_t(0x110000)})
+    EXPECT_EQ(bad.MapMemory((KRUniqueName(L"invalid") + invalid).GetString(), 8), 0);
   EXPECT_EQ(bad.MapMemory(L"", 8), 0);
   EXPECT_EQ(bad.MapMemory(name.GetString(), 0), 0);
-  EXPECT_EQ(bad.MapExistingMemory(UniqueName(L"never made").GetString(), 8), 0);
+  EXPECT_EQ(bad.MapExistingMemory(KRUniqueName(L"never made").GetString(), 8), 0);
   ExpectEmpty(bad);
-}
 
-TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
-  const CKRString name = UniqueName(L"processes");
+  // Two processes share named memory under the lock.
+  const CKRString between = KRUniqueName(L"processes");
   CKRMemMapFile parent;
-  ASSERT_EQ(parent.MapMemory(name.GetString(), 64), 1);
+  ASSERT_EQ(parent.MapMemory(between.GetString(), 64), 1);
   auto* text = static_cast<char*>(parent.Open());
   ASSERT_NE(text, nullptr);
   std::strcpy(text, "from the parent");
@@ -176,7 +161,7 @@ TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
   ASSERT_EQ(::pipe(turns), 0);
   const pid_t child = KRStartChild([&] {
     CKRMemMapFile mine;
-    if (mine.MapExistingMemory(name.GetString(), 64) != 1)
+    if (mine.MapExistingMemory(between.GetString(), 64) != 1)
       return 1;
     if (mine.Open(0) != nullptr || ::write(turns[1], "!", 1) != 1)
       return 2;   // the parent holds the lock
@@ -205,7 +190,7 @@ TEST(CKRMemMapFile, TwoProcessesShareNamedMemoryUnderTheLock) {
 TEST(CKRMemMapFile, MemoryNotTheUsersOwnIsRefusedAndLeftAlone) {
   if (!KRCanActAsAnotherUser())
     GTEST_SKIP() << "needs root to act as a second user";
-  const CKRString name = UniqueName(L"planted");
+  const CKRString name = KRUniqueName(L"planted");
   const std::vector<std::string> objects = KRSharedObjectsOf(name);   // the block and its lock
   ASSERT_EQ(objects.size(), 2u);
   CKRMemMapFile victim;
@@ -219,7 +204,7 @@ TEST(CKRMemMapFile, MemoryNotTheUsersOwnIsRefusedAndLeftAlone) {
     for (const std::string& object : objects) {
       struct stat info {};
       EXPECT_EQ(::stat(object.c_str(), &info), 0) << object << " is left alone";
-      EXPECT_EQ(info.st_uid, KRAnotherUser());
+      EXPECT_EQ(info.st_uid, kKRAnotherUser);
     }
   }
 

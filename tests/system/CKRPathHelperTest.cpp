@@ -30,14 +30,12 @@ TEST(CKRPathHelper, TextOperationsSplitAtTheLastSeparator) {
   EXPECT_EQ(CKRPathHelper::AddSlash(nullptr), L"");
 }
 
-TEST(CKRPathHelper, ExistenceFollowsLinksAndRefusesBadPaths) {
+TEST(CKRPathHelper, ExistenceAndCreatePathFollowLinksAndRefuseBadPaths) {
   CKRFilesScratch scratch;
-  scratch.WriteFile("file", "x");
-  scratch.MakeFolder("folder");
+  scratch.Make({"file", "folder/"});
   scratch.MakePipe("pipe");
   scratch.MakeLink(scratch.Native("folder"), "folder-link");
   scratch.MakeLink(scratch.Native("gone"), "dangling");
-  const wchar_t invalid[] = {L'/', L't', L'm', L'p', wchar_t(0x110000), L'\0'};
 
   // What, path, whether it exists, whether it is a directory.
   const std::tuple<const char*, CKRString, bool, bool> cases[] = {
@@ -50,7 +48,7 @@ TEST(CKRPathHelper, ExistenceFollowsLinksAndRefusesBadPaths) {
       {"missing", scratch.Wide("missing"), false, false},
       {"empty", CKRString(), false, false},
       {"overlong", CKRString(L"/") + CKRString(4096, L'x'), false, false},
-      {"beyond U+10FFFF", CKRString(invalid), false, false},
+      {"beyond U+10FFFF", CKRString(L"/tmp") + wchar_t(0x110000), false, false},
   };
   for (const auto& [what, path, exists, isDirectory] : cases) {
     SCOPED_TRACE(what);
@@ -58,8 +56,8 @@ TEST(CKRPathHelper, ExistenceFollowsLinksAndRefusesBadPaths) {
     EXPECT_EQ(CKRPathHelper::DirectoryExists(path.GetString()), isDirectory);
   }
   EXPECT_FALSE(CKRPathHelper::FileExists(nullptr) || CKRPathHelper::DirectoryExists(nullptr));
-  if (KRPermissionsApply()) {
-    scratch.MakeFolder("closed");
+  if (!KRCanActAsAnotherUser()) {
+    scratch.Make({"closed/"});
     ::chmod(scratch.Native("closed").c_str(), 0600);
     EXPECT_FALSE(CKRPathHelper::DirectoryExists(scratch.Wide("closed").GetString())) << "cannot be entered";
   }
@@ -68,12 +66,27 @@ TEST(CKRPathHelper, ExistenceFollowsLinksAndRefusesBadPaths) {
             scratch.Wide("folder/doc.txt"));
   EXPECT_EQ(CKRPathHelper::BuildCompletePath(scratch.Wide("missing").GetString(), L"/elsewhere/doc.txt"),
             L"/elsewhere/doc.txt");
+
+  // CreatePath makes every missing level, never through a link.
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c").GetString()), 1);
+  EXPECT_TRUE(CKRPathHelper::DirectoryExists(scratch.Wide("a/b/c").GetString()));
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c/").GetString()), 1) << "exists: nothing to do";
+
+  errno = 0;
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file").GetString()), 0);
+  EXPECT_EQ(errno, EEXIST);
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file/below").GetString()), 0);
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling").GetString()), 0);
+  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling/below").GetString()), 0);
+  EXPECT_NE(::access(scratch.Native("gone").c_str(), F_OK), 0) << "nothing made through the link";
+
+  EXPECT_EQ(CKRPathHelper::CreatePath(nullptr), 0);
+  EXPECT_EQ(CKRPathHelper::CreatePath((scratch.Wide("") + L"/" + CKRString(5000, L'n')).GetString()), 0);
 }
 
 TEST(CKRPathHelper, DirectoryTestsLeaveTheCurrentDirectoryAlone) {
   CKRFilesScratch scratch;
-  scratch.MakeFolder("work");
-  scratch.MakeFolder("other");
+  scratch.Make({"work/", "other/"});
   const std::filesystem::path before = std::filesystem::current_path();
   ASSERT_EQ(::chdir(scratch.Native("work").c_str()), 0);
   EXPECT_EQ(CKRPathHelper::GetCurrentWorkingDirectory(), scratch.Wide("work"));
@@ -87,44 +100,17 @@ TEST(CKRPathHelper, DirectoryTestsLeaveTheCurrentDirectoryAlone) {
   EXPECT_EQ(::getcwd(buffer, sizeof buffer), nullptr) << "still in the removed directory";
 
   // A name that is not UTF-8 has no exact wide form: no current directory.
-  scratch.MakeFolder("bad\xFF");
+  scratch.Make({"bad\xFF/"});
   ASSERT_EQ(::chdir(scratch.Native("bad\xFF").c_str()), 0);
   EXPECT_EQ(CKRPathHelper::GetCurrentWorkingDirectory(), L"");
   std::filesystem::current_path(before);
 }
 
-TEST(CKRPathHelper, CreatePathMakesEveryMissingLevel) {
-  CKRFilesScratch scratch;
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c").GetString()), 1);
-  EXPECT_TRUE(CKRPathHelper::DirectoryExists(scratch.Wide("a/b/c").GetString()));
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("a/b/c/").GetString()), 1) << "exists: nothing to do";
-
-  scratch.WriteFile("file", "x");
-  errno = 0;
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file").GetString()), 0);
-  EXPECT_EQ(errno, EEXIST);
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("file/below").GetString()), 0);
-  scratch.MakeLink(scratch.Native("gone"), "dangling");
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling").GetString()), 0);
-  EXPECT_EQ(CKRPathHelper::CreatePath(scratch.Wide("dangling/below").GetString()), 0);
-  EXPECT_NE(::access(scratch.Native("gone").c_str(), F_OK), 0) << "nothing made through the link";
-
-  EXPECT_EQ(CKRPathHelper::CreatePath(nullptr), 0);
-  EXPECT_EQ(CKRPathHelper::CreatePath((scratch.Wide("") + L"/" + CKRString(5000, L'n')).GetString()), 0);
-}
-
 TEST(CKRPathHelper, RemoveDirectoryRemovesTheTreeAndNothingOutside) {
   CKRFilesScratch scratch;
   // Outside the tree: a folder and a file that links inside point at.
-  scratch.MakeFolder("outside");
-  scratch.WriteFile("outside/keep.txt", "keep");
-  scratch.WriteFile("outside-file", "keep");
-
-  std::filesystem::create_directories(scratch.Native("tree/sub/deeper"));
-  scratch.WriteFile("tree/a.txt", "a");
+  scratch.Make({"outside/keep.txt", "outside-file", "tree/sub/deeper/", "tree/a.txt", "tree/locked/d.txt"});
   ::chmod(scratch.Native("tree/a.txt").c_str(), 0400);
-  scratch.MakeFolder("tree/locked");
-  scratch.WriteFile("tree/locked/d.txt", "d");
   ::chmod(scratch.Native("tree/locked").c_str(), 0500);
   scratch.MakeLink(scratch.Native("outside"), "tree/link-to-folder");
   scratch.MakeLink(scratch.Native("outside-file"), "tree/sub/link-to-file");
@@ -144,8 +130,7 @@ TEST(CKRPathHelper, RemoveDirectoryRemovesTheTreeAndNothingOutside) {
 
   // Spellings that name a folder through itself or a child: refused, with
   // nothing touched; a folder named through its parent goes.
-  std::filesystem::create_directories(scratch.Native("p/c/d"));
-  scratch.WriteFile("p/keep", "keep");
+  scratch.Make({"p/c/d/", "p/keep"});
   for (const char* spelling : {"p/.", "p/./", "p/c/..", "p/c/../", "p/c/d/../..", "p/c/../."}) {
     SCOPED_TRACE(spelling);
     EXPECT_EQ(CKRPathHelper::RemoveDirectoryW(scratch.Wide(spelling).GetString()), 0);
@@ -168,13 +153,7 @@ TEST(CKRPathHelper, RemoveDirectoryLeavesTheRootAndMountedFileSystemsAlone) {
   if (!KRCanActAsAnotherUser())
     GTEST_SKIP() << "needs root to confine a child to a scratch folder and mounts of its own";
   CKRFilesScratch scratch;
-  scratch.WriteFile("canary", "x");
-  scratch.MakeFolder("sub");
-  scratch.MakeFolder("outside");
-  scratch.WriteFile("outside/keep", "keep");
-  scratch.MakeFolder("tree");
-  scratch.MakeFolder("tree/mounted");
-  scratch.WriteFile("tree/file", "f");
+  scratch.Make({"canary", "sub/", "outside/keep", "tree/mounted/", "tree/file"});
   constexpr int kNoNamespace = 200;
   const int status = KRRunInChild([&] {
     // The bind mount is seen by this child only.
@@ -203,9 +182,7 @@ TEST(CKRPathHelper, RemoveDirectoryLeavesTheRootAndMountedFileSystemsAlone) {
 TEST(CKRPathHelper, GetChildPathsListsMatchingNames) {
   CKRFilesScratch scratch;
   // "bad\xFF.txt" is not UTF-8: it has no wide name.
-  for (const char* name : {"a.txt", "b.TXT", "c.dat", "noext", "\xC3\xA9.txt", "bad\xFF.txt"})
-    scratch.WriteFile(name, "");
-  scratch.MakeFolder("sub.txt");
+  scratch.Make({"a.txt", "b.TXT", "c.dat", "noext", "\xC3\xA9.txt", "bad\xFF.txt", "sub.txt/"});
   auto sorted = [](std::vector<CKRString> names) {
     std::sort(names.begin(), names.end());
     return names;
@@ -256,7 +233,7 @@ TEST(CKRPathHelper, AppPathStripsBuildFolders) {
   // whose names only begin like them.
   CKRFilesScratch scratch;
   const std::string folder = "Releases/App/Release/DebugUnicode/";
-  std::filesystem::create_directories(scratch.Native(folder));
+  scratch.Make({folder});
   const std::string copy = scratch.Native(folder + "MyApp");
   std::filesystem::copy_file(self, copy);
   const std::string report = scratch.Native("report.txt");

@@ -2,9 +2,7 @@
 
 #include "KRThreadTestSupport.h"
 
-using krtest::CActor;
-using krtest::CFunctionThread;
-using krtest::WaitUntil;
+using namespace krtest;
 
 namespace {
 
@@ -20,28 +18,18 @@ void ExpectFree(TLock& lock) {
 // Both locks: what they share is tested on each.
 template <class TLock>
 class CKRReaderWriterLockTest : public testing::Test {};
-struct SKRLockNames {
-  template <class TLock>
-  static std::string GetName(int) {
-    return std::is_same_v<TLock, CKRReaderWriterLock> ? "CKRReaderWriterLock" : "CReaderWriterLockNonReentrance";
-  }
-};
 using KRLockTypes = testing::Types<CReaderWriterLockNonReentrance, CKRReaderWriterLock>;
-TYPED_TEST_SUITE(CKRReaderWriterLockTest, KRLockTypes, SKRLockNames);
+TYPED_TEST_SUITE(CKRReaderWriterLockTest, KRLockTypes);
 
 // A writer waits for a reader; readers arriving behind a waiting writer wait
 // too, and a second writer still goes before them.
-TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
+TYPED_TEST(CKRReaderWriterLockTest, PrefersWritersAndIgnoresReleasesOfWhatIsNotHeld) {
   TypeParam lock;
-  std::mutex logMutex;
-  std::string log;
+  CRecords<char> log;
   auto logged = [&](bool write) {
     return [&, write] {
       write ? lock.AcquireWriterLock() : lock.AcquireReaderLock();
-      {
-        std::lock_guard<std::mutex> guard(logMutex);
-        log += write ? "W" : "R";
-      }
+      log.Add(write ? 'W' : 'R');
       write ? lock.ReleaseWriterLock() : lock.ReleaseReaderLock();
     };
   };
@@ -56,16 +44,12 @@ TYPED_TEST(CKRReaderWriterLockTest, PrefersWriters) {
 
   ASSERT_TRUE(firstReader.Do([&] { lock.ReleaseReaderLock(); }));
   EXPECT_TRUE(firstWritten->Wait() && secondWritten->Wait() && secondRead->Wait());
-  EXPECT_EQ(log, "WWR");
+  EXPECT_EQ(log.WaitFor(), (std::vector<char>{'W', 'W', 'R'}));
   ExpectFree(lock);
-}
 
-// Releasing what the thread does not hold changes nothing and is reported.
-TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
-  krtest::CDebugRecorder recorder;
-  TypeParam lock;
-  CActor reader, writer;
-  ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
+  // Releasing what the thread does not hold changes nothing and is reported.
+  CDebugRecorder recorder;
+  ASSERT_TRUE(firstReader.Do([&] { lock.AcquireReaderLock(); }));
   lock.ReleaseReaderLock();
   lock.ReleaseWriterLock();
   EXPECT_EQ(lock.GetReaderCount(), 1);
@@ -74,19 +58,19 @@ TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
 
   // Had the count dropped, this writer would get in while the reader reads.
   std::atomic<bool> written{false};
-  const auto writing = writer.Post([&] {
+  const auto writing = firstWriter.Post([&] {
     lock.AcquireWriterLock();
     written = true;
   });
   ASSERT_TRUE(WaitUntil([&] { return lock.GetWriterCount() == 1; }));
   lock.ReleaseReaderLock();
   EXPECT_FALSE(written.load());
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseReaderLock(); }));
+  ASSERT_TRUE(firstReader.Do([&] { lock.ReleaseReaderLock(); }));
   ASSERT_TRUE(writing->Wait());
 
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseWriterLock(); }));   // nor another thread's write lock
+  ASSERT_TRUE(firstReader.Do([&] { lock.ReleaseWriterLock(); }));   // nor another thread's write lock
   EXPECT_EQ(lock.GetWriterCount(), 1);
-  ASSERT_TRUE(writer.Do([&] { lock.ReleaseWriterLock(); }));
+  ASSERT_TRUE(firstWriter.Do([&] { lock.ReleaseWriterLock(); }));
   EXPECT_EQ(recorder.Texts().size(), 4u);
   ExpectFree(lock);
 }
@@ -95,15 +79,19 @@ TYPED_TEST(CKRReaderWriterLockTest, IgnoresReleasesByThreadsThatHoldNothing) {
 // asked.
 TYPED_TEST(CKRReaderWriterLockTest, KilledWaitersLeaveTheLockConsistent) {
   TypeParam lock;
+  // A thread that asks for the lock, killed once `waits` shows it waiting.
+  auto killWaiter = [&](bool write, auto waits) {
+    CFunctionThread waiter([&](CFunctionThread&) -> unsigned long {
+      write ? lock.AcquireWriterLock() : lock.AcquireReaderLock();
+      return 1;
+    });
+    waiter.Start();
+    ASSERT_TRUE(WaitUntil(waits));
+    waiter.Kill(7);
+  };
   CActor holder, another;
   ASSERT_TRUE(holder.Do([&] { lock.AcquireReaderLock(); }));
-  CFunctionThread writer([&](CFunctionThread&) -> unsigned long {
-    lock.AcquireWriterLock();
-    return 1;
-  });
-  writer.Start();
-  ASSERT_TRUE(WaitUntil([&] { return lock.GetWriterCount() == 1; }));
-  writer.Kill(7);
+  killWaiter(true, [&] { return lock.GetWriterCount() == 1; });
   EXPECT_EQ(lock.GetWriterCount(), 0);
   EXPECT_EQ(lock.GetReaderCount(), 1);
   // New readers are not held up by the writer that is gone.
@@ -116,13 +104,7 @@ TYPED_TEST(CKRReaderWriterLockTest, KilledWaitersLeaveTheLockConsistent) {
     lock.AcquireWriterLock();
   }));
 
-  CFunctionThread reader([&](CFunctionThread&) -> unsigned long {
-    lock.AcquireReaderLock();
-    return 1;
-  });
-  reader.Start();
-  ASSERT_TRUE(WaitUntil([&] { return lock.GetWaitingReaderCount() == 1; }));
-  reader.Kill(8);
+  killWaiter(false, [&] { return lock.GetWaitingReaderCount() == 1; });
   EXPECT_EQ(lock.GetWaitingReaderCount(), 0);
   ASSERT_TRUE(holder.Do([&] { lock.ReleaseWriterLock(); }));
   ASSERT_TRUE(another.Do([&] {
@@ -195,29 +177,27 @@ TYPED_TEST(CKRReaderWriterLockTest, ReadersAndWritersNeverSeeATornUpdate) {
   ExpectFree(lock);
 }
 
-TEST(CKRReaderWriterLock, ARecursiveReaderDoesNotWaitForAWaitingWriter) {
+// A recursive reader does not wait for a waiting writer; a reader upgrades
+// once the other readers left, and downgrades back to reading.
+TEST(CKRReaderWriterLock, ReentersReadingUpgradesAndDowngrades) {
   CKRReaderWriterLock lock;
-  CActor reader, writer;
-  ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
+  CActor upgrader, otherReader, lateReader;
+  ASSERT_TRUE(upgrader.Do([&] { lock.AcquireReaderLock(); }));
   std::atomic<bool> written{false};
-  const auto writing = writer.Post([&] {
+  const auto writing = lateReader.Post([&] {
     lock.AcquireWriterLock();
     written = true;
     lock.ReleaseWriterLock();
   });
   ASSERT_TRUE(WaitUntil([&] { return lock.GetWriterCount() == 1; }));
   // A non-reentrant lock would deadlock here.
-  ASSERT_TRUE(reader.Do([&] { lock.AcquireReaderLock(); }));
+  ASSERT_TRUE(upgrader.Do([&] { lock.AcquireReaderLock(); }));
   EXPECT_EQ(lock.GetReaderCount(), 1);
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseReaderLock(); }));
+  ASSERT_TRUE(upgrader.Do([&] { lock.ReleaseReaderLock(); }));
   EXPECT_FALSE(written.load());
-  ASSERT_TRUE(reader.Do([&] { lock.ReleaseReaderLock(); }));
+  ASSERT_TRUE(upgrader.Do([&] { lock.ReleaseReaderLock(); }));
   EXPECT_TRUE(writing->Wait());
-}
 
-TEST(CKRReaderWriterLock, UpgradesAfterOtherReadersLeaveAndDowngradesToReading) {
-  CKRReaderWriterLock lock;
-  CActor upgrader, otherReader, lateReader;
   ASSERT_TRUE(upgrader.Do([&] { lock.AcquireReaderLock(); }));
   ASSERT_TRUE(otherReader.Do([&] { lock.AcquireReaderLock(); }));
   const auto upgraded = upgrader.Post([&] { lock.AcquireWriterLock(); });
@@ -260,7 +240,7 @@ TEST(CKRReaderWriterLock, AThreadMayHoldManyLocksAtOnce) {
   }
   std::mt19937 random(KRTestSeed());
   std::shuffle(order.begin(), order.end(), random);
-  krtest::CDebugRecorder recorder;
+  CDebugRecorder recorder;
   for (int i : order) {
     if (i % 3 == 0)
       locks[i].ReleaseWriterLock();

@@ -1,9 +1,8 @@
 #include <krCoreLib/system/CKRSingleAppInstance.h>
 
 #include "KRFilesScratch.h"
+#include "KRThreadTestSupport.h"
 
-#include <condition_variable>
-#include <mutex>
 #include <sys/socket.h>
 #include <sys/un.h>
 
@@ -44,10 +43,6 @@ private:
   std::vector<std::optional<std::string>> m_Saved;
 };
 
-CKRString UniqueID(const wchar_t* what) {
-  return CKRString::Formatted(L"krFilesTestApp-%s-%d-%u", what, int(::getpid()), KRTestSeed());
-}
-
 // What a second instance, in a child process started in `folder`, finds:
 // kNotDetected, or what became of its file (_EKRHandOver).
 constexpr int kNotDetected = -1;
@@ -64,32 +59,14 @@ int DetectInChild(const CKRString& id, std::vector<const char*> arguments = {}, 
   return status == 20 ? kNotDetected : status;
 }
 
-// What the running instance's listener was asked: an empty file name for an
-// activation without one.
-class CKRRequests {
-public:
-  void Add(const CKRString& file) {
-    const std::lock_guard<std::mutex> lock(m_Mutex);
-    m_Requests.push_back(file);
-    m_Changed.notify_all();
-  }
-  std::vector<CKRString> WaitFor(std::size_t count) {
-    std::unique_lock<std::mutex> lock(m_Mutex);
-    m_Changed.wait_for(lock, std::chrono::seconds(60), [&] { return m_Requests.size() >= count; });
-    return m_Requests;
-  }
-
-private:
-  std::mutex m_Mutex;
-  std::condition_variable m_Changed;
-  std::vector<CKRString> m_Requests;
-};
+// What the running instance's listener was asked.
+using CKRRequests = krtest::CRecords<CKRString>;
 
 }  // namespace
 
-TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
+TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstWhileItLivesAndHandsItAFile) {
   CKRScratchRuntime scratch;
-  const CKRString id = UniqueID(L"handover");
+  const CKRString id = KRUniqueName(L"handover");
   _EKRHandOver handOver = KRHANDOVER_FAILED;
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr, &handOver)) << "the first";
   EXPECT_EQ(handOver, KRHANDOVER_NONE);
@@ -105,7 +82,7 @@ TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
 
   // Started in another folder with a relative name; then an absolute name,
   // one that is not UTF-8 (not handed over, as it cannot be exactly), none.
-  scratch.MakeFolder("elsewhere");
+  scratch.Make({"elsewhere/"});
   EXPECT_EQ(DetectInChild(id, {"-n", "docs/plan \xC3\xA9.txt", "second.txt"}, scratch.Native("elsewhere")),
             KRHANDOVER_DELIVERED);
   EXPECT_EQ(DetectInChild(id, {"/data/model.kr"}), KRHANDOVER_DELIVERED);
@@ -119,20 +96,28 @@ TEST(CKRSingleAppInstance, SecondProcessFindsTheFirstAndHandsItAFile) {
   EXPECT_FALSE(listener.IsRunning());
   EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE) << "still running, though no longer listening";
   EXPECT_EQ(DetectInChild(id, {"/data/model.kr"}), KRHANDOVER_FAILED);
+
+  // The lock ends with its process; separators and a length beyond a socket
+  // address still make one instance.
+  const CKRString other = KRUniqueName(L"a/b\\c") + CKRString(300, L'x');
+  EXPECT_EQ(DetectInChild(other), kNotDetected) << "a first instance that ends";
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(other.GetString(), 0, nullptr)) << "free again";
+  EXPECT_EQ(DetectInChild(other), KRHANDOVER_NONE);
+  // Only the holder of the lock may listen.
+  EXPECT_EQ(KRRunInChild([&] { return CKRSingleAppInstanceListener().Start(other.GetString(), nullptr, nullptr); }), 0);
 }
 
 // Fifty instances started at once, while four connections that never say
 // anything are held open: every file name arrives.
 TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
   CKRScratchRuntime scratch;
-  const CKRString id = UniqueID(L"many");
+  const CKRString id = KRUniqueName(L"many");
   CKRRequests requests;
   CKRSingleAppInstanceListener listener;
   ASSERT_TRUE(listener.Start(id.GetString(), nullptr, [&](const CKRString& file) { requests.Add(file); }));
 
   const std::string socketPath = scratch.Native("run/krCoreLib-") + id.ToUtf8() + "-test.sock";
-  sockaddr_un address {};
-  address.sun_family = AF_UNIX;
+  sockaddr_un address{AF_UNIX, {}};
   ASSERT_LT(socketPath.size(), sizeof address.sun_path);
   std::memcpy(address.sun_path, socketPath.c_str(), socketPath.size() + 1);
   std::vector<int> silent;
@@ -166,26 +151,12 @@ TEST(CKRSingleAppInstance, ManyInstancesAtOnceAllHandOverTheirFiles) {
   ::close(start[1]);
   for (const pid_t child : children)
     EXPECT_EQ(KRWaitChild(child), KRHANDOVER_DELIVERED);
-  std::vector<CKRString> received = requests.WaitFor(kInstances);
+  std::vector<CKRString> received = requests.WaitFor(kInstances, std::chrono::seconds(60));
   std::sort(received.begin(), received.end());
   std::sort(expected.begin(), expected.end());
   EXPECT_EQ(received, expected);
   for (const int fd : silent)
     ::close(fd);
-}
-
-TEST(CKRSingleAppInstance, TheLockEndsWithItsProcess) {
-  CKRScratchRuntime scratch;
-  // Separators and a length beyond a socket address: still one instance.
-  const CKRString id = UniqueID(L"a/b\\c") + CKRString(300, L'x');
-  EXPECT_EQ(DetectInChild(id), kNotDetected) << "a first instance that ends";
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr)) << "free again";
-  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
-  EXPECT_EQ(KRRunInChild([&] {   // only the holder of the lock may listen
-              CKRSingleAppInstanceListener listener;
-              return listener.Start(id.GetString(), nullptr, nullptr) ? 1 : 0;
-            }),
-            0);
 }
 
 TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
@@ -198,7 +169,7 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   // Without a runtime folder of its own the user gets a private one in the
   // temporary folder ...
   ::unsetenv("XDG_RUNTIME_DIR");
-  const CKRString id = UniqueID(L"fallback");
+  const CKRString id = KRUniqueName(L"fallback");
   EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(id.GetString(), 0, nullptr));
   EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
   struct stat info {};
@@ -209,49 +180,45 @@ TEST(CKRSingleAppInstance, BadIDsAndFoldersDetectNothing) {
   // or one open to others (one of another user: next test).
   const std::string unsafe = scratch.UseOtherTemporaryFolder();
   scratch.MakeLink(scratch.Native("run"), unsafe);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"unsafe").GetString(), 0, nullptr));
-  EXPECT_FALSE(listener.Start(UniqueID(L"unsafe").GetString(), nullptr, nullptr));
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"unsafe").GetString(), 0, nullptr));
+  EXPECT_FALSE(listener.Start(KRUniqueName(L"unsafe").GetString(), nullptr, nullptr));
   ::unlink(scratch.Native(unsafe).c_str());
-  scratch.MakeFolder(unsafe);
+  scratch.Make({unsafe + "/"});
   ::chmod(scratch.Native(unsafe).c_str(), 0770);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"open").GetString(), 0, nullptr));
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"open").GetString(), 0, nullptr));
 }
 
-TEST(CKRSingleAppInstance, FoldersOfAnotherUserAreNotUsed) {
-  if (!KRCanActAsAnotherUser())
-    GTEST_SKIP() << "needs root to give folders to a second user";
-  CKRScratchRuntime scratch;
-  // A private folder of another user is refused ...
-  ::unsetenv("XDG_RUNTIME_DIR");
-  const std::string unsafe = scratch.UseOtherTemporaryFolder();
-  ::mkdir(scratch.Native(unsafe).c_str(), 0700);
-  ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), KRAnotherUser(), KRAnotherUser()), 0);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"other's").GetString(), 0, nullptr));
-  // ... and a runtime folder of another user is passed over for the
-  // private one.
-  ASSERT_EQ(::chown(scratch.Native("run").c_str(), KRAnotherUser(), KRAnotherUser()), 0);
-  ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
-  ::setenv("TMPDIR", scratch.Native().c_str(), 1);
-  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(UniqueID(L"passed over").GetString(), 0, nullptr));
-  EXPECT_EQ(DetectInChild(UniqueID(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
-}
-
-// Shared memory that another user planted under the application ID: the
-// file name is not written into it, and the hand-over is reported failed.
-TEST(CKRSingleAppInstance, AHandOverThroughMemoryOfAnotherUserFails) {
+// What another user owns is never used: shared memory planted under the
+// application ID (the file name is not written into it, and the hand-over
+// is reported failed), a private folder of that user, a runtime folder of
+// that user (passed over for the private one).
+TEST(CKRSingleAppInstance, WhatAnotherUserOwnsIsNotUsed) {
   if (!KRCanActAsAnotherUser())
     GTEST_SKIP() << "needs root to act as a second user";
   CKRScratchRuntime scratch;
-  const CKRString id = UniqueID(L"planted");
+  const CKRString id = KRUniqueName(L"planted id");
   const std::vector<std::string> objects = KRSharedObjectsOf(id);   // the block and its lock
   ASSERT_EQ(objects.size(), 2u);
-  CKRRequests requests;
-  CKRSingleAppInstanceListener listener;
-  ASSERT_TRUE(listener.Start(
-      id.GetString(), [&] { requests.Add(L"activation"); }, [&](const CKRString& file) { requests.Add(file); }));
-  CKRPlantedObjects planted(objects);
-  ASSERT_TRUE(planted.IsPlanted());
-  EXPECT_EQ(DetectInChild(id, {"/data/secret.kr"}), KRHANDOVER_FAILED);
-  EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
-  EXPECT_EQ(requests.WaitFor(2), (std::vector<CKRString>{L"activation", L"activation"})) << "no file arrived";
+  {
+    CKRRequests requests;
+    CKRSingleAppInstanceListener listener;
+    ASSERT_TRUE(listener.Start(
+        id.GetString(), [&] { requests.Add(L"activation"); }, [&](const CKRString& file) { requests.Add(file); }));
+    CKRPlantedObjects planted(objects);
+    ASSERT_TRUE(planted.IsPlanted());
+    EXPECT_EQ(DetectInChild(id, {"/data/secret.kr"}), KRHANDOVER_FAILED);
+    EXPECT_EQ(DetectInChild(id), KRHANDOVER_NONE);
+    EXPECT_EQ(requests.WaitFor(2), (std::vector<CKRString>{L"activation", L"activation"})) << "no file arrived";
+  }
+
+  ::unsetenv("XDG_RUNTIME_DIR");
+  const std::string unsafe = scratch.UseOtherTemporaryFolder();
+  ::mkdir(scratch.Native(unsafe).c_str(), 0700);
+  ASSERT_EQ(::chown(scratch.Native(unsafe).c_str(), kKRAnotherUser, kKRAnotherUser), 0);
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"other's").GetString(), 0, nullptr));
+  ASSERT_EQ(::chown(scratch.Native("run").c_str(), kKRAnotherUser, kKRAnotherUser), 0);
+  ::setenv("XDG_RUNTIME_DIR", scratch.Native("run").c_str(), 1);
+  ::setenv("TMPDIR", scratch.Native().c_str(), 1);
+  EXPECT_FALSE(CKRSingleAppInstance::DetectAppInstance(KRUniqueName(L"passed over").GetString(), 0, nullptr));
+  EXPECT_EQ(DetectInChild(KRUniqueName(L"passed over")), KRHANDOVER_NONE) << "found in the private folder";
 }

@@ -4,14 +4,9 @@
 
 #include "KRThreadTestSupport.h"
 
-#include <cstdio>
 #include <unistd.h>
 
-using krtest::CFunctionThread;
-using krtest::CGate;
-using krtest::kGenerousSteps;
-using krtest::kNotStopped;
-using krtest::Stopped;
+using namespace krtest;
 
 TEST(CKRThread, RunsItsHandlerAndStartsAgainAfterItEnded) {
   std::atomic<int> runs{0};
@@ -56,7 +51,7 @@ TEST(CKRThread, RunsItsHandlerAndStartsAgainAfterItEnded) {
   }
 }
 
-TEST(CKRThread, RepeatedCommandsAreQueuedOnceAndImmediateOnesGoFirst) {
+TEST(CKRThread, CommandsQueueOnceAndStopNeverWaitsOnItsOwnThread) {
   CGate posted;
   std::vector<int> received;
   CFunctionThread thread([&](CFunctionThread& self) -> unsigned long {
@@ -81,16 +76,14 @@ TEST(CKRThread, RepeatedCommandsAreQueuedOnceAndImmediateOnesGoFirst) {
     received.pop_back();
   EXPECT_EQ(received, (std::vector<int>{KRTHREAD_CMD_RESET, KRTHREAD_CMD_STARTED, KRTHREAD_CMD_PAUSE,
                                         KRTHREAD_CMD_CONTINUE, KRTHREAD_CMD_RUN, KRTHREAD_CMD_RESET}));
-}
 
-TEST(CKRThread, StopEndsAHandlerThatReactsAndNeverWaitsOnItsOwnThread) {
+  // Stop ends a handler that reacts to it.
   CFunctionThread reacting([](CFunctionThread& self) -> unsigned long {
     for (int command = KRTHREAD_CMD_NONE; command != KRTHREAD_CMD_STOP;)
       self.WaitForNotification(command, KRTHREAD_INFINITE);
     return 42;
   });
-  reacting.Start();
-  EXPECT_EQ(Stopped(reacting), 42u);
+  EXPECT_EQ(Ran(reacting), 42u);
   EXPECT_EQ(reacting.GetActivityStatus(), KRTHREAD_STATUS_IDLE);
 
   // Stop called by the handler on its own thread queues "stop" and returns.
@@ -102,12 +95,37 @@ TEST(CKRThread, StopEndsAHandlerThatReactsAndNeverWaitsOnItsOwnThread) {
     me.WaitForNotification(command, KRTHREAD_INFINITE);
     return static_cast<unsigned long>(command);
   });
-  self.Start();
-  EXPECT_EQ(Stopped(self), static_cast<unsigned long>(KRTHREAD_CMD_STARTED)) << "\"started\" came first";
+  EXPECT_EQ(Ran(self), static_cast<unsigned long>(KRTHREAD_CMD_STARTED)) << "\"started\" came first";
   EXPECT_EQ(ownStop.load(), 0);
 }
 
-TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
+TEST(CKRThread, TheProcessLockExcludesAndKillEndsAThreadAtEachKillPoint) {
+  // The process lock excludes other threads while it exists.
+  CKRThread::ProcessUnlock();   // closed, and held by nobody: ignored
+  CKRThread::OpenProcessLocking();
+  CKRThread::OpenProcessLocking();   // once is enough
+  CKRThread::ProcessLock();
+  CKRThread::ProcessLock();
+  std::atomic<bool> acquired{false};
+  CGate mayUnlock;
+  CFunctionThread other([&](CFunctionThread&) -> unsigned long {
+    CKRThread::ProcessUnlock();   // not held by this thread: ignored
+    CKRThread::ProcessLock();
+    acquired = true;
+    EXPECT_TRUE(mayUnlock.Wait());
+    CKRThread::ProcessUnlock();
+    return 0;
+  });
+  other.Start();
+  CKRThread::ProcessUnlock();
+  EXPECT_FALSE(acquired.load()) << "still held once by this thread";
+  CKRThread::ProcessUnlock();
+  EXPECT_TRUE(WaitUntil([&] { return acquired.load(); }));
+  // Closing while another thread holds it: that thread still unlocks.
+  CKRThread::CloseProcessLocking();
+  mayUnlock.Open();
+  EXPECT_NE(Stopped(other), kNotStopped);
+
   // The test thread holds the process lock throughout, so that taking it
   // waits (groups wait alike).
   CKRThread::OpenProcessLocking();
@@ -115,10 +133,10 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
 
   using Wait = std::function<void(CFunctionThread&)>;
   const std::pair<const char*, Wait> cases[] = {
-      {"command wait", [](CFunctionThread& self) { krtest::IgnoreCommands(self); }},
+      {"command wait", [](CFunctionThread& self) { IgnoreCommands(self); }},
       // A timed wait, which a cancellation could not end under the address
       // sanitizer.
-      {"timed command wait", [](CFunctionThread& self) { krtest::IgnoreCommands(self, 60000); }},
+      {"timed command wait", [](CFunctionThread& self) { IgnoreCommands(self, 60000); }},
       {"process lock", [](CFunctionThread&) { CKRThread::ProcessLock(); }},
       {"status wait", [](CFunctionThread& self) { self.WaitForActivityStatus(99, KRTHREAD_INFINITE); }},
       {"computing", [](CFunctionThread&) {
@@ -162,159 +180,10 @@ TEST(CKRThread, KillEndsAThreadAtEachKillPointUnwindingItsStack) {
     after = true;
     return 1;
   });
-  suicidal.Start();
-  EXPECT_EQ(Stopped(suicidal), 9u);
+  EXPECT_EQ(Ran(suicidal), 9u);
   EXPECT_FALSE(after.load());
   // OnKill runs on the ending thread, just after the run ended.
-  EXPECT_TRUE(krtest::WaitUntil([&] { return suicidal.m_KillCount.load() == 1; }));
-}
-
-// Kill never cancels from outside: the library's input and output runs to
-// its end, and a thread inside it that does not come out in time is
-// reported, the process going on.
-TEST(CKRThread, KillIsBoundedAndNeverEndsTheProcess) {
-  int channel[2];
-  ASSERT_EQ(::pipe(channel), 0);
-  std::FILE* input = ::fdopen(channel[0], "rb");
-  ASSERT_NE(input, nullptr);
-  CGate reading;
-  std::atomic<int> bytesRead{-1};
-  CFunctionThread reader([&](CFunctionThread& self) -> unsigned long {
-    unsigned char byte = 0;
-    reading.Open();
-    bytesRead = static_cast<int>(CKRSystem::Read1(input, 1, &byte));   // waits for the pipe
-    krtest::IgnoreCommands(self);
-  });
-  EXPECT_EQ(reader.GetKillTimeout(), CKRThread::kKillTimeoutSteps);
-  reader.SetKillTimeout(1);
-  reader.Start();
-  ASSERT_TRUE(reading.Wait());
-  try {
-    reader.Kill(5);
-    ADD_FAILURE() << "a thread reading an empty pipe was killed";
-  } catch (CKRThreadException* exception) {
-    EXPECT_EQ(exception->GetType(), KRTHREAD_ERROR_TERMINATE_FAILED);
-    exception->Delete();
-  }
-  EXPECT_EQ(reader.IsAlive(), 1);
-  EXPECT_EQ(reader.m_KillCount.load(), 0);
-  // Once the read is over, the pending kill ends the thread at its next
-  // kill point, with the kill's exit code (and no OnKill, as no Kill saw
-  // the end).
-  ASSERT_EQ(::write(channel[1], "x", 1), 1);
-  EXPECT_EQ(Stopped(reader), 5u);
-  EXPECT_EQ(bytesRead.load(), 1) << "the read ran to its end";
-  EXPECT_EQ(reader.m_KillCount.load(), 0);
-  std::fclose(input);
-  ::close(channel[1]);
-
-  // A stream of commands: the thread always finds one queued, yet ends.
-  std::atomic<long> taken{0};
-  CFunctionThread flooded([&](CFunctionThread& self) -> unsigned long {
-    for (int command = KRTHREAD_CMD_NONE;; ++taken)
-      self.WaitForNotification(command, KRTHREAD_INFINITE);
-  });
-  flooded.Start();
-  std::atomic<bool> flooding{true}, floodEnded{false};
-  std::thread flooder([&] {
-    const auto end = std::chrono::steady_clock::now() + krtest::kGenerous;
-    while (flooding.load() && std::chrono::steady_clock::now() < end) {
-      flooded.Pause();
-      flooded.Continue();
-    }
-    floodEnded = true;
-  });
-  EXPECT_TRUE(krtest::WaitUntil([&] { return taken.load() > 1000; }));
-  flooded.Kill(9);
-  EXPECT_FALSE(floodEnded.load()) << "Kill returned only when the commands stopped";
-  flooding = false;
-  flooder.join();
-  EXPECT_EQ(flooded.GetExitCode(), 9u);
-}
-
-TEST(CKRThread, GroupMembersExcludeEachOtherAndARunEndingInsideTheLockReleasesIt) {
-  krtest::CDebugRecorder recorder;
-  constexpr int kRounds = 2000;
-  std::atomic<int> inside{0};
-  std::atomic<bool> overlapped{false};
-  long long shared = 0;
-  auto body = [&](CFunctionThread& self) -> unsigned long {
-    for (int i = 0; i < kRounds; ++i) {
-      self.Lock();
-      self.Lock();   // recursive
-      overlapped = overlapped || inside++ != 0;
-      shared = shared + 1;
-      --inside;
-      self.Unlock();
-      self.Unlock();
-    }
-    return 0;
-  };
-  CFunctionThread first(body), second(body);
-  // One member returns holding the lock, one is killed holding it; `member`
-  // stays in the group throughout, so the group lives on.
-  CGate locked, memberMayEnd;
-  CFunctionThread returning([&](CFunctionThread& self) -> unsigned long {
-    self.Lock();
-    return 0;
-  });
-  CFunctionThread killed([&](CFunctionThread& self) -> unsigned long {
-    self.Lock();
-    locked.Open();
-    krtest::IgnoreCommands(self);
-  });
-  CFunctionThread member([&](CFunctionThread&) -> unsigned long { return memberMayEnd.Wait() ? 0 : 1; });
-  for (CFunctionThread* thread : {&first, &second, &returning, &killed, &member})
-    thread->SetSynchronicity(1, L"counter");
-  member.Start();
-  first.Start();
-  second.Start();
-  EXPECT_NE(Stopped(first), kNotStopped);
-  EXPECT_NE(Stopped(second), kNotStopped);
-  EXPECT_FALSE(overlapped.load());
-  EXPECT_EQ(shared, 2LL * kRounds);
-
-  returning.Start();
-  EXPECT_NE(Stopped(returning), kNotStopped);
-  first.Start();
-  EXPECT_NE(Stopped(first), kNotStopped);
-  killed.Start();
-  ASSERT_TRUE(locked.Wait());
-  killed.Kill(1);
-  first.Start();
-  EXPECT_NE(Stopped(first), kNotStopped);
-  EXPECT_EQ(shared, 4LL * kRounds);
-  memberMayEnd.Open();
-  EXPECT_NE(Stopped(member), kNotStopped);
-  // Each thread ending inside the lock reports it, just after its run ended.
-  EXPECT_TRUE(krtest::WaitUntil([&] { return recorder.Texts().size() == 2; }));
-}
-
-TEST(CKRThread, TheProcessLockExcludesOtherThreadsWhileItExists) {
-  CKRThread::ProcessUnlock();   // closed, and held by nobody: ignored
-  CKRThread::OpenProcessLocking();
-  CKRThread::OpenProcessLocking();   // once is enough
-  CKRThread::ProcessLock();
-  CKRThread::ProcessLock();
-  std::atomic<bool> acquired{false};
-  CGate mayUnlock;
-  CFunctionThread other([&](CFunctionThread&) -> unsigned long {
-    CKRThread::ProcessUnlock();   // not held by this thread: ignored
-    CKRThread::ProcessLock();
-    acquired = true;
-    EXPECT_TRUE(mayUnlock.Wait());
-    CKRThread::ProcessUnlock();
-    return 0;
-  });
-  other.Start();
-  CKRThread::ProcessUnlock();
-  EXPECT_FALSE(acquired.load()) << "still held once by this thread";
-  CKRThread::ProcessUnlock();
-  EXPECT_TRUE(krtest::WaitUntil([&] { return acquired.load(); }));
-  // Closing while another thread holds it: that thread still unlocks.
-  CKRThread::CloseProcessLocking();
-  mayUnlock.Open();
-  EXPECT_NE(Stopped(other), kNotStopped);
+  EXPECT_TRUE(WaitUntil([&] { return suicidal.m_KillCount.load() == 1; }));
 }
 
 namespace {
@@ -347,17 +216,48 @@ private:
 
 }  // namespace
 
-TEST(CKRThread, DestroyingARunningObjectKillsItsThread) {
-  krtest::CDebugRecorder recorder;
+// Kill never cancels from outside: the library's input and output runs to
+// its end, and a thread inside it that does not come out in time is
+// reported, the process going on.
+TEST(CKRThread, KillAndDestructionAreBoundedAndNeverEndTheProcess) {
   int channel[2];
   ASSERT_EQ(::pipe(channel), 0);
   std::FILE* input = ::fdopen(channel[0], "rb");
   ASSERT_NE(input, nullptr);
+  CGate reading;
+  std::atomic<int> bytesRead{-1};
+  CFunctionThread reader([&](CFunctionThread& self) -> unsigned long {
+    unsigned char byte = 0;
+    reading.Open();
+    bytesRead = static_cast<int>(CKRSystem::Read1(input, 1, &byte));   // waits for the pipe
+    IgnoreCommands(self);
+  });
+  reader.SetKillTimeout(1);
+  reader.Start();
+  ASSERT_TRUE(reading.Wait());
+  try {
+    reader.Kill(5);
+    ADD_FAILURE() << "a thread reading an empty pipe was killed";
+  } catch (CKRThreadException* exception) {
+    EXPECT_EQ(exception->GetType(), KRTHREAD_ERROR_TERMINATE_FAILED);
+    exception->Delete();
+  }
+  EXPECT_EQ(reader.IsAlive(), 1);
+  EXPECT_EQ(reader.m_KillCount.load(), 0);
+  // Once the read is over, the pending kill ends the thread at its next
+  // kill point, with the kill's exit code (and no OnKill, as no Kill saw
+  // the end).
+  ASSERT_EQ(::write(channel[1], "x", 1), 1);
+  EXPECT_EQ(Stopped(reader), 5u);
+  EXPECT_EQ(bytesRead.load(), 1) << "the read ran to its end";
+  EXPECT_EQ(reader.m_KillCount.load(), 0);
+
+  // Destroying a running object whose class has no destructor of its own
+  // reports the kill that failed and waits for the read to end.
+  CDebugRecorder recorder;
   // Feeds the read once the destructor has reported that it waits for it.
   std::thread feeder([&] {
-    if (krtest::WaitUntil([&] { return recorder.Texts().size() >= 2; })) {
-      EXPECT_EQ(::write(channel[1], "x", 1), 1);
-    }
+    EXPECT_TRUE(WaitUntil([&] { return recorder.Texts().size() >= 2; }) && ::write(channel[1], "x", 1) == 1);
   });
   CGate entered;
   {
@@ -373,4 +273,82 @@ TEST(CKRThread, DestroyingARunningObjectKillsItsThread) {
   EXPECT_NE(texts[1].find(L"waiting for it to end"), std::wstring::npos);
   std::fclose(input);
   ::close(channel[1]);
+
+  // A stream of commands: the thread always finds one queued, yet ends.
+  std::atomic<long> taken{0};
+  CFunctionThread flooded([&](CFunctionThread& self) -> unsigned long {
+    for (int command = KRTHREAD_CMD_NONE;; ++taken)
+      self.WaitForNotification(command, KRTHREAD_INFINITE);
+  });
+  flooded.Start();
+  std::atomic<bool> flooding{true}, floodEnded{false};
+  std::thread flooder([&] {
+    const auto end = std::chrono::steady_clock::now() + kGenerous;
+    while (flooding.load() && std::chrono::steady_clock::now() < end) {
+      flooded.Pause();
+      flooded.Continue();
+    }
+    floodEnded = true;
+  });
+  EXPECT_TRUE(WaitUntil([&] { return taken.load() > 1000; }));
+  flooded.Kill(9);
+  EXPECT_FALSE(floodEnded.load()) << "Kill returned only when the commands stopped";
+  flooding = false;
+  flooder.join();
+  EXPECT_EQ(flooded.GetExitCode(), 9u);
+}
+
+TEST(CKRThread, GroupMembersExcludeEachOtherAndARunEndingInsideTheLockReleasesIt) {
+  CDebugRecorder recorder;
+  constexpr int kRounds = 2000;
+  std::atomic<int> inside{0};
+  std::atomic<bool> overlapped{false};
+  long long shared = 0;
+  auto body = [&](CFunctionThread& self) -> unsigned long {
+    for (int i = 0; i < kRounds; ++i) {
+      self.Lock();
+      self.Lock();   // recursive
+      overlapped = overlapped || inside++ != 0;
+      shared = shared + 1;
+      --inside;
+      self.Unlock();
+      self.Unlock();
+    }
+    return 0;
+  };
+  CFunctionThread first(body), second(body);
+  // One member returns holding the lock, one is killed holding it; `member`
+  // stays in the group throughout, so the group lives on.
+  CGate locked, memberMayEnd;
+  CFunctionThread returning([&](CFunctionThread& self) -> unsigned long {
+    self.Lock();
+    return 0;
+  });
+  CFunctionThread killed([&](CFunctionThread& self) -> unsigned long {
+    self.Lock();
+    locked.Open();
+    IgnoreCommands(self);
+  });
+  CFunctionThread member([&](CFunctionThread&) -> unsigned long { return memberMayEnd.Wait() ? 0 : 1; });
+  for (CFunctionThread* thread : {&first, &second, &returning, &killed, &member})
+    thread->SetSynchronicity(1, L"counter");
+  member.Start();
+  first.Start();
+  second.Start();
+  EXPECT_NE(Stopped(first), kNotStopped);
+  EXPECT_NE(Stopped(second), kNotStopped);
+  EXPECT_FALSE(overlapped.load());
+  EXPECT_EQ(shared, 2LL * kRounds);
+
+  EXPECT_NE(Ran(returning), kNotStopped);
+  EXPECT_NE(Ran(first), kNotStopped);
+  killed.Start();
+  ASSERT_TRUE(locked.Wait());
+  killed.Kill(1);
+  EXPECT_NE(Ran(first), kNotStopped);
+  EXPECT_EQ(shared, 4LL * kRounds);
+  memberMayEnd.Open();
+  EXPECT_NE(Stopped(member), kNotStopped);
+  // Each thread ending inside the lock reports it, just after its run ended.
+  EXPECT_TRUE(WaitUntil([&] { return recorder.Texts().size() == 2; }));
 }

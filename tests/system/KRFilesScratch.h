@@ -1,12 +1,13 @@
-// Helpers of the file, path and shared-memory tests: a scratch folder that
-// is unique to the test process and removed with everything in it, and
-// direct system calls to prepare what the library must cope with.
+// Helpers of the file, path and shared-memory tests: a scratch folder with
+// ways to fill it, and direct system calls to prepare what the library must
+// cope with.
 #pragma once
 
 #include <krCoreLib/core/CKRString.h>
 #include <krCoreLib/system/CKRMemMapFile.h>
 #include <krCoreLib/system/CKRSystem.h>
 
+#include "KRScratchFolder.h"
 #include "KRTestSeed.h"
 
 #include <gtest/gtest.h>
@@ -15,20 +16,16 @@
 #include <array>
 #include <cerrno>
 #include <cmath>
-#include <cstdio>
-#include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <optional>
 #include <random>
 #include <string>
-#include <system_error>
 #include <thread>
 #include <tuple>
 #include <vector>
 
-#include <dirent.h>
 #include <fcntl.h>
 #include <grp.h>
 #include <sys/file.h>
@@ -36,27 +33,10 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-class CKRFilesScratch {
+class CKRFilesScratch : public CKRScratchFolder {
 public:
-  CKRFilesScratch() {
-    std::string pattern = (std::filesystem::temp_directory_path() / "krfiles-XXXXXX").string();
-    if (::mkdtemp(pattern.data()) == nullptr) {
-      std::perror("no scratch folder");
-      std::abort();
-    }
-    m_Root = pattern;
-  }
-  ~CKRFilesScratch() {
-    std::error_code error;   // give back permissions taken away, so that everything goes
-    for (auto it = std::filesystem::recursive_directory_iterator(m_Root, error);
-         !error && it != std::filesystem::recursive_directory_iterator(); it.increment(error)) {
-      if (it->is_directory(error) && !it->is_symlink(error))
-        ::chmod(it->path().c_str(), 0700);
-    }
-    std::filesystem::remove_all(m_Root, error);
-  }
   // The path of a name inside the folder ("" for the folder itself).
-  std::string Native(const std::string& name = "") const { return name.empty() ? m_Root : m_Root + "/" + name; }
+  std::string Native(const std::string& name = "") const { return name.empty() ? Root() : Path(name); }
   CKRString Wide(const std::string& name = "") const { return CKRString::FromUtf8(Native(name)); }
 
   void WriteFile(const std::string& name, const std::string& content) const {
@@ -65,36 +45,43 @@ public:
     ASSERT_EQ(::write(fd, content.data(), content.size()), ssize_t(content.size()));
     ::close(fd);
   }
-  void MakeFolder(const std::string& name) const { ASSERT_EQ(::mkdir(Native(name).c_str(), 0755), 0) << name; }
   void MakeLink(const std::string& target, const std::string& name) const {
     ASSERT_EQ(::symlink(target.c_str(), Native(name).c_str()), 0) << name;
   }
   void MakePipe(const std::string& name) const { ASSERT_EQ(::mkfifo(Native(name).c_str(), 0600), 0) << name; }
   // A sparse file of `size` bytes.
   void MakeSparse(const std::string& name, off_t size) const {
-    const int fd = ::open(Native(name).c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0644);
-    ASSERT_GE(fd, 0);
-    ASSERT_EQ(::ftruncate(fd, size), 0);
-    ::close(fd);
+    WriteFile(name, "");
+    std::filesystem::resize_file(Native(name), std::uintmax_t(size));
   }
-
-private:
-  std::string m_Root;
+  // Makes each entry with the folders above it: a folder where the name ends
+  // in "/", else a file holding its own name.
+  void Make(std::initializer_list<std::string> names) const {
+    for (const std::string& name : names) {
+      std::filesystem::create_directories(std::filesystem::path(Native(name)).parent_path());
+      if (name.back() != '/')
+        WriteFile(name, name);
+    }
+  }
 };
 
 // Paths every file service must refuse, made inside `scratch`.
 inline std::vector<std::pair<const char*, CKRString>> KRBadPaths(const CKRFilesScratch& scratch) {
-  scratch.MakeFolder("bad-folder");
+  scratch.Make({"bad-folder/"});
   scratch.MakePipe("bad-pipe");
   scratch.MakeLink(scratch.Native("bad-gone"), "bad-dangling");
-  const wchar_t invalid[] = {L'/', L't', L'm', L'p', L'/', wchar_t(0xD800), L'\0'};
   return {{"empty", CKRString()},
           {"overlong", scratch.Wide() + L"/" + CKRString(5000, L'a')},
-          {"lone surrogate", CKRString(invalid)},
+          {"lone surrogate", CKRString(L"/tmp/") + wchar_t(0xD800)},
           {"missing folder", scratch.Wide("no/such/file")},
           {"directory", scratch.Wide("bad-folder")},
           {"pipe without a writer", scratch.Wide("bad-pipe")},
           {"dangling link", scratch.Wide("bad-dangling")}};
+}
+
+// A name no other test process uses at the same time.
+inline CKRString KRUniqueName(const wchar_t* what) {
+  return CKRString::Formatted(L"krFilesTest-%s-%d-%u", what, int(::getpid()), KRTestSeed());
 }
 
 // A file's content through CKRSystem::Load.
@@ -108,15 +95,10 @@ inline std::string KRLoadText(const CKRString& path) {
   return text;
 }
 
-// Number of open descriptors of this process.
+// Number of open descriptors of this process (with the one that lists them).
 inline int KROpenDescriptorCount() {
-  int count = 0;
-  if (DIR* dir = ::opendir("/proc/self/fd")) {
-    while (::readdir(dir) != nullptr)
-      ++count;
-    ::closedir(dir);
-  }
-  return count;
+  using std::filesystem::directory_iterator;
+  return int(std::distance(directory_iterator("/proc/self/fd"), directory_iterator()));
 }
 
 // Starts `body` in a forked child that ends with _exit(body()); -1 on failure.
@@ -155,17 +137,11 @@ inline int KRRunTestProgram(const std::string& program, const char* test) {
   });
 }
 
-// True when file permissions bind this process (they do not for root).
-inline bool KRPermissionsApply() {
-  return ::geteuid() != 0;
-}
-
 // The second user of the tests that need one: "nobody" (65534), which owns
 // nothing of the tests.
-inline uid_t KRAnotherUser() {
-  return 65534;
-}
-// Whether a forked child can become that user (only root can).
+inline constexpr uid_t kKRAnotherUser = 65534;
+// Whether a forked child can become that user: only root can, and only for
+// others do file permissions bind.
 inline bool KRCanActAsAnotherUser() {
   return ::geteuid() == 0;
 }
@@ -173,7 +149,7 @@ inline bool KRCanActAsAnotherUser() {
 inline bool KRBecomeAnotherUser() {
   const gid_t group = 65534;
   return ::setgroups(0, nullptr) == 0 && ::setresgid(group, group, group) == 0 &&
-         ::setresuid(KRAnotherUser(), KRAnotherUser(), KRAnotherUser()) == 0;
+         ::setresuid(kKRAnotherUser, kKRAnotherUser, kKRAnotherUser) == 0;
 }
 
 // The system's paths of the shared memory named `name` and of its lock:

@@ -1,5 +1,6 @@
 // What the thread and lock tests share: bounded waits on conditions, gates,
-// helper threads that run steps on request, and a recorder of debug output.
+// helper threads that run steps on request, records of what other threads
+// report (debug output among them).
 // Every wait is for a condition, with a limit that fails the test instead
 // of hanging it.
 #pragma once
@@ -51,24 +52,34 @@ bool WaitUntil(TCondition condition) {
   return true;
 }
 
-// A one-way gate: closed until Open.
-class CGate {
+// What other threads report, in the order it came.
+template <class T>
+class CRecords {
 public:
-  // Notifies under the lock: a waiter may destroy the gate once it returns.
-  void Open() {
+  // Notifies under the lock: a waiter may destroy the records once it returns.
+  void Add(T item) {
     std::lock_guard<std::mutex> lock(m_Mutex);
-    m_Open = true;
-    m_Signal.notify_all();
+    m_Items.push_back(std::move(item));
+    m_Changed.notify_all();
   }
-  bool Wait() {
+  // Everything so far, once there are `count` items or the limit passed.
+  std::vector<T> WaitFor(std::size_t count = 0, std::chrono::seconds limit = kGenerous) {
     std::unique_lock<std::mutex> lock(m_Mutex);
-    return m_Signal.wait_for(lock, kGenerous, [this] { return m_Open; });
+    m_Changed.wait_for(lock, limit, [&] { return m_Items.size() >= count; });
+    return m_Items;
   }
 
 private:
   std::mutex m_Mutex;
-  std::condition_variable m_Signal;
-  bool m_Open = false;
+  std::condition_variable m_Changed;
+  std::vector<T> m_Items;
+};
+
+// A one-way gate: closed until Open.
+class CGate : CRecords<bool> {
+public:
+  void Open() { Add(true); }
+  bool Wait() { return !WaitFor(1).empty(); }
 };
 
 // A helper thread that runs the test's steps in order, so that the test
@@ -119,24 +130,15 @@ private:
 };
 
 // Records CKRDebugOutput texts while it exists.
-class CDebugRecorder {
+class CDebugRecorder : public CRecords<std::wstring> {
 public:
   CDebugRecorder() : m_Previous(CKRDebugOutput::SetHandler(&Record, this)) {}
   ~CDebugRecorder() { CKRDebugOutput::SetHandler(m_Previous); }
-  std::vector<std::wstring> Texts() {
-    std::lock_guard<std::mutex> lock(m_Mutex);
-    return m_Texts;
-  }
+  std::vector<std::wstring> Texts() { return WaitFor(); }
 
 private:
-  static void Record(const wchar_t* text, void* context) {
-    auto* self = static_cast<CDebugRecorder*>(context);
-    std::lock_guard<std::mutex> lock(self->m_Mutex);
-    self->m_Texts.emplace_back(text);
-  }
+  static void Record(const wchar_t* text, void* context) { static_cast<CDebugRecorder*>(context)->Add(text); }
   CKRDebugOutput::Handler m_Previous;
-  std::mutex m_Mutex;
-  std::vector<std::wstring> m_Texts;
 };
 
 // A thread whose handler the test gives, with the protected operations a
@@ -172,6 +174,12 @@ inline constexpr unsigned long kNotStopped = 0xDEADu;
 inline unsigned long Stopped(CKRThread& thread) {
   unsigned long exitCode = 0;
   return thread.Stop(exitCode, kGenerousSteps) == 1 ? exitCode : kNotStopped;
+}
+
+// Starts `thread` and stops it: its exit code, or kNotStopped.
+inline unsigned long Ran(CKRThread& thread) {
+  thread.Start();
+  return Stopped(thread);
 }
 
 // Ignores every command, forever: only Kill ends it.
