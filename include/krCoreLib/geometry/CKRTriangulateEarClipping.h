@@ -32,7 +32,7 @@
 // vertices by their bounding box's minimum corner and scale them by the
 // largest power of two that keeps the box within 2^20 and 2^24 (s the larger
 // extent of the box; s = 0 leaves the scale at 1, though such input has no
-// area and is refused first), TYPE_REAL by the power of two nearest below
+// area and is refused first), TYPE_REAL by the largest power of two not above
 // 1 / s; TYPE_RATIONAL and TYPE_FILTERED use the input positions. Scaling
 // by a power of two rounds nothing: integral input whose box fits is used
 // at its exact positions. The integer strategies truncate the scaled
