@@ -606,10 +606,9 @@ long WithKey(HKEY key, EKRCall kind, Body body) {
   return body(connection, ref, &transaction);
 }
 
-}  // namespace
-
-long SKRRegistryStore::OpenKey(HKEY key, const wchar_t* subKey, std::uint32_t access, bool create,
-                               std::uint32_t options, HKEY* result, std::uint32_t* disposition) {
+// Opens, or with `create` creates, `subKey` below `key`.
+long OpenKey(HKEY key, const wchar_t* subKey, std::uint32_t access, bool create, std::uint32_t options, HKEY* result,
+             std::uint32_t* disposition) {
   if (result == nullptr)
     return KRERROR_INVALID_PARAMETER;
   *result = nullptr;
@@ -652,7 +651,18 @@ long SKRRegistryStore::OpenKey(HKEY key, const wchar_t* subKey, std::uint32_t ac
   });
 }
 
-long SKRRegistryStore::QueryInfo(HKEY key, std::uint32_t* subKeys, std::uint32_t* maxSubKeyLength,
+}  // namespace
+
+long KRRegOpenKeyEx(HKEY key, const wchar_t* subKey, std::uint32_t, std::uint32_t access, HKEY* result) {
+  return OpenKey(key, subKey, access, false, 0, result, nullptr);
+}
+
+long KRRegCreateKeyEx(HKEY key, const wchar_t* subKey, std::uint32_t options, std::uint32_t access, HKEY* result,
+                      std::uint32_t* disposition) {
+  return OpenKey(key, subKey, access, true, options, result, disposition);
+}
+
+long KRRegQueryInfoKey(HKEY key, std::uint32_t* subKeys, std::uint32_t* maxSubKeyLength,
                                  std::uint32_t* values, std::uint32_t* maxValueNameLength,
                                  std::uint32_t* maxValueLength) {
   return WithKey(key, EKRCall::Read,
@@ -692,12 +702,12 @@ long SKRRegistryStore::QueryInfo(HKEY key, std::uint32_t* subKeys, std::uint32_t
   });
 }
 
-long SKRRegistryStore::QueryValue(HKEY key, const wchar_t* name, std::uint32_t* type, std::uint8_t* data,
+long KRRegQueryValueEx(HKEY key, const wchar_t* name, std::uint32_t* type, std::uint8_t* data,
                                   std::uint32_t* size) {
   if (data != nullptr && size == nullptr)
     return KRERROR_INVALID_PARAMETER;
   const std::size_t nameLength = ValueNameLength(name);
-  if (nameLength > kMaxValueNameLength)
+  if (nameLength > SKRRegistryStore::kMaxValueNameLength)
     return KRERROR_FILE_NOT_FOUND;
   return WithKey(key, EKRCall::Statement,
                  [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction*) -> long {
@@ -731,10 +741,11 @@ long SKRRegistryStore::QueryValue(HKEY key, const wchar_t* name, std::uint32_t* 
   });
 }
 
-long SKRRegistryStore::SetValue(HKEY key, const wchar_t* name, std::uint32_t type, const std::uint8_t* data,
+long KRRegSetValueEx(HKEY key, const wchar_t* name, std::uint32_t type, const std::uint8_t* data,
                                 std::uint32_t size) {
   const std::size_t nameLength = ValueNameLength(name);
-  if (nameLength > kMaxValueNameLength || size > kMaxValueSize || (data == nullptr && size > 0))
+  if (nameLength > SKRRegistryStore::kMaxValueNameLength || size > KRREG_MAX_VALUE_SIZE ||
+      (data == nullptr && size > 0))
     return KRERROR_INVALID_PARAMETER;
   return WithKey(key, EKRCall::WriteValues,
                  [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction* transaction) -> long {
@@ -762,7 +773,7 @@ long SKRRegistryStore::SetValue(HKEY key, const wchar_t* name, std::uint32_t typ
   });
 }
 
-long SKRRegistryStore::EnumValue(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength,
+long KRRegEnumValue(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength,
                                  std::uint32_t* type, std::uint8_t* data, std::uint32_t* size) {
   if (name == nullptr || nameLength == nullptr || (data != nullptr && size == nullptr))
     return KRERROR_INVALID_PARAMETER;
@@ -811,7 +822,7 @@ long SKRRegistryStore::EnumValue(HKEY key, std::uint32_t index, wchar_t* name, s
   });
 }
 
-long SKRRegistryStore::EnumKey(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength) {
+long KRRegEnumKeyEx(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength) {
   if (name == nullptr || nameLength == nullptr)
     return KRERROR_INVALID_PARAMETER;
   return WithKey(key, EKRCall::Read,
@@ -876,9 +887,9 @@ long SKRRegistryStore::EnumKey(HKEY key, std::uint32_t index, wchar_t* name, std
   });
 }
 
-long SKRRegistryStore::DeleteValue(HKEY key, const wchar_t* name) {
+long KRRegDeleteValue(HKEY key, const wchar_t* name) {
   const std::size_t nameLength = ValueNameLength(name);
-  if (nameLength > kMaxValueNameLength)
+  if (nameLength > SKRRegistryStore::kMaxValueNameLength)
     return KRERROR_FILE_NOT_FOUND;
   return WithKey(key, EKRCall::WriteValues,
                  [&](SKRConnection& connection, const SKRKeyRef& ref, SKRTransaction* transaction) -> long {
@@ -898,7 +909,7 @@ long SKRRegistryStore::DeleteValue(HKEY key, const wchar_t* name) {
   });
 }
 
-long SKRRegistryStore::DeleteKey(HKEY key, const wchar_t* subKey) {
+long KRRegDeleteKey(HKEY key, const wchar_t* subKey) {
   std::vector<std::wstring> parts;
   if (subKey == nullptr || subKey[0] == L'\0' || !SplitPath(subKey, parts))
     return KRERROR_INVALID_PARAMETER;
@@ -943,7 +954,7 @@ long SKRRegistryStore::DeleteKey(HKEY key, const wchar_t* subKey) {
   });
 }
 
-long SKRRegistryStore::CloseKey(HKEY key) {
+long KRRegCloseKey(HKEY key) {
   const auto raw = reinterpret_cast<std::uintptr_t>(key);
   if (raw >= 0x80000000u && raw < 0x80000000u + std::uintptr_t(kRootCount))
     return KRERROR_SUCCESS;

@@ -1,6 +1,7 @@
-// The durable store behind the registry calls: two SQLite databases, one
-// per user for the ordinary keys and one in the user's runtime folder for
-// the volatile keys, opened on one connection (the volatile one attached).
+// The durable store behind the registry calls of KRRegistryAPI.h, which
+// SKRRegistryStore.cpp defines: two SQLite databases, one per user for the
+// ordinary keys and one in the user's runtime folder for the volatile keys,
+// opened on one connection (the volatile one attached).
 //
 // Where the stores live: both in $KR_REGISTRY_DIR when it is set and not
 // empty; otherwise the ordinary store in $XDG_CONFIG_HOME/krCoreLib (an
@@ -21,20 +22,16 @@
 // that one id names a key in either store. The seven root keys are the
 // ordinary store's ids 1 to 7.
 //
-// All members are safe to call from any thread (one process-wide mutex;
-// every call is one SQLite transaction, so other processes see whole calls).
+// Every call is safe from any thread (one process-wide mutex) and is one
+// SQLite transaction, so other processes see whole calls.
 #pragma once
 
 #include <krCoreLib/platform/KRRegistryAPI.h>
 
 #include <cstdint>
 
+// The store's bounds.
 struct SKRRegistryStore {
-  // Largest value the store keeps, in bytes: 1 MiB. The desktop registry
-  // advises against values beyond a few kilobytes and slows down well below
-  // this; a bound keeps a hostile or mistaken caller from filling the disk
-  // one call at a time.
-  static constexpr std::uint32_t kMaxValueSize = 1u << 20;
   // Longest key name (one part of a path) is 254 characters and longest
   // value name 16383 characters, as on the desktop registry.
   static constexpr std::size_t kMaxKeyNameLength = 254;
@@ -42,19 +39,4 @@ struct SKRRegistryStore {
   // How long a call waits for another writer before it gives up with
   // KRERROR_ACCESS_DENIED.
   static constexpr int kBusyTimeoutMs = 5000;
-
-  static long OpenKey(HKEY key, const wchar_t* subKey, std::uint32_t access, bool create, std::uint32_t options,
-                      HKEY* result, std::uint32_t* disposition);
-  static long QueryInfo(HKEY key, std::uint32_t* subKeys, std::uint32_t* maxSubKeyLength, std::uint32_t* values,
-                        std::uint32_t* maxValueNameLength, std::uint32_t* maxValueLength);
-  static long QueryValue(HKEY key, const wchar_t* name, std::uint32_t* type, std::uint8_t* data,
-                         std::uint32_t* size);
-  static long SetValue(HKEY key, const wchar_t* name, std::uint32_t type, const std::uint8_t* data,
-                       std::uint32_t size);
-  static long EnumValue(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength,
-                        std::uint32_t* type, std::uint8_t* data, std::uint32_t* size);
-  static long EnumKey(HKEY key, std::uint32_t index, wchar_t* name, std::uint32_t* nameLength);
-  static long DeleteValue(HKEY key, const wchar_t* name);
-  static long DeleteKey(HKEY key, const wchar_t* subKey);
-  static long CloseKey(HKEY key);
 };

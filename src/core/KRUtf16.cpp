@@ -45,3 +45,21 @@ void SKRUtf16::Encode(std::wstring_view text, std::u16string& out) {
     }
   }
 }
+
+std::size_t SKRUtf16::DecodeTerminated(const void* bytes, std::size_t size, std::wstring& out) {
+  const auto* data = static_cast<const unsigned char*>(bytes);
+  std::u16string units;
+  units.reserve(size / 2);
+  std::size_t taken = 0;
+  while (taken + 1 < size) {
+    const auto unit = char16_t(data[taken] | (data[taken + 1] << 8));
+    taken += 2;
+    if (unit == u'\0') {
+      Decode(units, out);
+      return taken;
+    }
+    units.push_back(unit);
+  }
+  Decode(units, out);
+  return size;
+}

@@ -33,36 +33,16 @@ long ReadValue(HKEY key, const wchar_t* name, std::uint32_t& type, std::string& 
   return KRERROR_MORE_DATA;
 }
 
-// The UTF-16 code units of stored string data (little-endian); a stray odd
-// byte is dropped.
-std::u16string Units(const std::string& bytes) {
-  std::u16string units(bytes.size() / 2, u'\0');
-  for (std::size_t i = 0; i < units.size(); ++i)
-    units[i] = char16_t(std::uint8_t(bytes[2 * i]) | (std::uint8_t(bytes[2 * i + 1]) << 8));
-  return units;
-}
-
-CKRString Decode(std::u16string_view units) {
-  std::wstring text;
-  SKRUtf16::Decode(units, text);
-  return CKRString(std::move(text));
-}
-
 // A stored text: up to its first null, or all of it when it has none.
 CKRString DecodeText(const std::string& bytes) {
-  const std::u16string units = Units(bytes);
-  return Decode(std::u16string_view(units).substr(0, units.find(u'\0')));
+  std::wstring text;
+  SKRUtf16::DecodeTerminated(bytes.data(), bytes.size(), text);
+  return CKRString(std::move(text));
 }
 
 // Appends the UTF-16 form of `text` and a null unit, as little-endian bytes.
 void AppendEncoded(const CKRString& text, std::string& bytes) {
-  std::u16string units;
-  SKRUtf16::Encode(text.str(), units);
-  units.push_back(u'\0');
-  for (const char16_t unit : units) {
-    bytes.push_back(char(unit & 0xFF));
-    bytes.push_back(char(unit >> 8));
-  }
+  SKRUtf16::EncodeTerminated(text.str(), bytes);
 }
 
 bool HasNull(const CKRString& text) {
@@ -285,15 +265,12 @@ _EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_
     return result;
   // Strings up to the empty one that ends the list; a last string without
   // its null still counts.
-  const std::u16string units = Units(bytes);
-  for (std::size_t start = 0; start < units.size();) {
-    std::size_t end = units.find(u'\0', start);
-    if (end == start)
+  for (std::size_t start = 0; start + 1 < bytes.size();) {
+    std::wstring text;
+    start += SKRUtf16::DecodeTerminated(bytes.data() + start, bytes.size() - start, text);
+    if (text.empty())
       break;
-    if (end == std::u16string::npos)
-      end = units.size();
-    value.push_back(Decode(std::u16string_view(units).substr(start, end - start)));
-    start = end + 1;
+    value.push_back(CKRString(std::move(text)));
   }
   return KRREGISTRY_SUCCESS;
 }
@@ -313,17 +290,32 @@ _EKRRegistryErrors CKRRegistry::PutRegValue(const wchar_t* section, const wchar_
   return WriteEntry(section, entry, key, KRREG_MULTI_SZ, bytes);
 }
 
-_EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry,
-                                            std::map<CKRGuid, CKRString>& value, HKEY key) {
-  value.clear();
+_EKRRegistryErrors CKRRegistry::OpenMapKey(const wchar_t* section, const wchar_t* entry, HKEY key, bool create,
+                                           HKEY& map) const {
+  map = nullptr;
   HKEY opened = nullptr;
   const _EKRRegistryErrors result = OpenSection(section, key, opened);
   if (result != KRREGISTRY_SUCCESS)
     return result;
   CKRKeyCloser closer(opened);
-  HKEY map = nullptr;
-  if (entry == nullptr || entry[0] == L'\0' || KRRegOpenKeyEx(opened, entry, 0, kAllAccess, &map) != KRERROR_SUCCESS)
+  if (entry == nullptr || entry[0] == L'\0')
     return KRREGISTRY_FAILED;
+  const long status = create ? KRRegCreateKeyEx(opened, entry, KRREG_OPTION_NON_VOLATILE, kAllAccess, &map, nullptr)
+                             : KRRegOpenKeyEx(opened, entry, 0, kAllAccess, &map);
+  if (status != KRERROR_SUCCESS) {
+    map = nullptr;
+    return KRREGISTRY_FAILED;
+  }
+  return KRREGISTRY_SUCCESS;
+}
+
+_EKRRegistryErrors CKRRegistry::GetRegValue(const wchar_t* section, const wchar_t* entry,
+                                            std::map<CKRGuid, CKRString>& value, HKEY key) {
+  value.clear();
+  HKEY map = nullptr;
+  const _EKRRegistryErrors result = OpenMapKey(section, entry, key, false, map);
+  if (result != KRREGISTRY_SUCCESS)
+    return result;
   CKRKeyCloser mapCloser(map);
   std::vector<CKRString> names;
   if (!ValueNames(map, names))
@@ -345,15 +337,10 @@ _EKRRegistryErrors CKRRegistry::PutRegValue(const wchar_t* section, const wchar_
   for (const auto& [guid, text] : value)
     if (HasNull(text))
       return KRREGISTRY_FAILED;
-  HKEY opened = nullptr;
-  const _EKRRegistryErrors result = OpenSection(section, key, opened);
+  HKEY map = nullptr;
+  const _EKRRegistryErrors result = OpenMapKey(section, entry, key, true, map);
   if (result != KRREGISTRY_SUCCESS)
     return result;
-  CKRKeyCloser closer(opened);
-  HKEY map = nullptr;
-  if (entry == nullptr || entry[0] == L'\0' ||
-      KRRegCreateKeyEx(opened, entry, KRREG_OPTION_NON_VOLATILE, kAllAccess, &map, nullptr) != KRERROR_SUCCESS)
-    return KRREGISTRY_FAILED;
   CKRKeyCloser mapCloser(map);
   // Listed first, deleted after: deleting while listing would skip values.
   std::vector<CKRString> names;

@@ -53,7 +53,7 @@ class KRCORELIB_API CKRRegistry {
 public:
   // Largest value read, in bytes: the store's own bound (1 MiB). A larger
   // value can only come from a damaged or foreign store and is not read.
-  static constexpr std::uint32_t kMaxValueSize = 1u << 20;
+  static constexpr std::uint32_t kMaxValueSize = KRREG_MAX_VALUE_SIZE;
   // Deepest key nesting the export descends into, as the desktop
   // registry's limit of 512 levels; a deeper tree fails the export.
   static constexpr int kMaxExportDepth = 512;
@@ -138,6 +138,9 @@ public:
 private:
   // The section key below the base key (all access), or the reason why not.
   _EKRRegistryErrors OpenSection(const wchar_t* section, HKEY key, HKEY& opened) const;
+  // The key `entry` below the section (all access), created when `create`
+  // is set: the key that holds a GUID map.
+  _EKRRegistryErrors OpenMapKey(const wchar_t* section, const wchar_t* entry, HKEY key, bool create, HKEY& map) const;
   // The bytes of a value of the given type in the section; wrong type: 7.
   _EKRRegistryErrors ReadEntry(const wchar_t* section, const wchar_t* entry, HKEY key, std::uint32_t type,
                                std::string& bytes) const;

@@ -18,9 +18,6 @@ namespace {
 // for again; a few rounds settle any writer that is not rewriting it
 // without pause.
 constexpr int kQueryRounds = 4;
-// The store refuses values larger than 1 MiB (KRRegistryAPI.h); a larger
-// size can only come from a damaged store and is not read.
-constexpr std::uint32_t kLargestValue = 1u << 20;
 // Key names in the store are far shorter; a name that does not fit this
 // many characters is skipped rather than read into an ever larger buffer.
 constexpr std::uint32_t kLongestKeyName = 32767;
@@ -32,30 +29,16 @@ bool IsPredefined(HKEY key) {
 }
 
 std::vector<std::uint8_t> Utf16Bytes(const CKRString& text) {
-  std::u16string units;
-  SKRUtf16::Encode(text.str(), units);
-  units.push_back(u'\0');
   std::vector<std::uint8_t> bytes;
-  bytes.reserve(units.size() * 2);
-  for (char16_t unit : units) {
-    bytes.push_back(static_cast<std::uint8_t>(unit & 0xFF));
-    bytes.push_back(static_cast<std::uint8_t>(unit >> 8));
-  }
+  SKRUtf16::EncodeTerminated(text.str(), bytes);
   return bytes;
 }
 
 // The text up to the first null character, or all of it; an odd last byte
 // is no character.
 CKRString TextOfBytes(const std::vector<std::uint8_t>& bytes) {
-  std::u16string units;
-  for (std::size_t i = 0; i + 1 < bytes.size(); i += 2) {
-    const auto unit = static_cast<char16_t>(bytes[i] | (bytes[i + 1] << 8));
-    if (unit == u'\0')
-      break;
-    units.push_back(unit);
-  }
   std::wstring text;
-  SKRUtf16::Decode(units, text);
+  SKRUtf16::DecodeTerminated(bytes.data(), bytes.size(), text);
   return CKRString(std::move(text));
 }
 
@@ -239,7 +222,7 @@ bool CKRRegistrySerializer::QueryValue(const CKRString& name, std::uint32_t type
     m_LastResult = KRRegQueryValueEx(m_hCurrentKey, name.GetString(), &storedType, nullptr, &size);
     m_LastValueType = storedType;
     m_LastValueSize = size;
-    if (m_LastResult != KRERROR_SUCCESS || storedType != type || size > kLargestValue)
+    if (m_LastResult != KRERROR_SUCCESS || storedType != type || size > KRREG_MAX_VALUE_SIZE)
       return false;
     // The store tells the size of what it holds: the buffer is never
     // larger than the value.

@@ -65,6 +65,13 @@ constexpr long KRERROR_NO_MORE_ITEMS = 259;
 // could not outlive its parent).
 constexpr long KRERROR_CHILD_MUST_BE_VOLATILE = 1021;
 
+// Largest value the store keeps, in bytes: 1 MiB. The desktop registry
+// advises against values beyond a few kilobytes and slows down well below
+// this; the bound keeps a hostile or mistaken caller from filling the disk
+// one call at a time, and lets readers refuse larger sizes, which can only
+// come from a damaged store, before they allocate.
+constexpr std::uint32_t KRREG_MAX_VALUE_SIZE = 1u << 20;
+
 // Value types. Any other type number is stored and returned as bytes.
 constexpr std::uint32_t KRREG_NONE = 0;
 constexpr std::uint32_t KRREG_SZ = 1;
