@@ -23,6 +23,25 @@ auto Retry(Call call) {
   }
 }
 
+// Opens a regular file of at most `maxSize` bytes for reading; its size in
+// `size`. The kind and size are checked on the descriptor, and the open
+// never waits for the writer of a pipe (O_NONBLOCK, cleared again once the
+// file is known to be regular). -1 on failure.
+int OpenRegular(const char* path, std::uint64_t maxSize, std::size_t& size) noexcept {
+  const int fd = Retry([&] { return ::open(path, O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK); });
+  if (fd < 0)
+    return -1;
+  struct stat info {};
+  const int status = ::fcntl(fd, F_GETFL);
+  if (::fstat(fd, &info) != 0 || !S_ISREG(info.st_mode) || info.st_size < 0 ||
+      std::uint64_t(info.st_size) > maxSize || status < 0 || ::fcntl(fd, F_SETFL, status & ~O_NONBLOCK) != 0) {
+    ::close(fd);
+    return -1;
+  }
+  size = std::size_t(info.st_size);
+  return fd;
+}
+
 // Closes a descriptor and reports whether it closed cleanly. An interrupted
 // close has still released the descriptor on Linux; it must not be retried.
 bool CloseChecked(int fd) noexcept {
@@ -272,18 +291,10 @@ bool SKRFiles::ReadWholeFile(const char* path, std::uint64_t maxSize, unsigned c
                              std::size_t& size) noexcept {
   data = nullptr;
   size = 0;
-  // O_NONBLOCK: opening a pipe must not wait for a writer; it is refused
-  // below like every other special file.
-  const int fd = ::open(path, O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK);
+  std::size_t length = 0;
+  const int fd = OpenRegular(path, maxSize, length);
   if (fd < 0)
     return false;
-  struct stat info {};
-  if (::fstat(fd, &info) != 0 || !S_ISREG(info.st_mode) || info.st_size < 0 ||
-      std::uint64_t(info.st_size) > maxSize) {
-    ::close(fd);
-    return false;
-  }
-  const std::size_t length = std::size_t(info.st_size);
   unsigned char* buffer = new (std::nothrow) unsigned char[length > 0 ? length : 1];
   if (buffer == nullptr) {
     ::close(fd);
@@ -347,16 +358,10 @@ std::FILE* SKRFiles::OpenStream(const char* path, const char* mode) noexcept {
 }
 
 std::FILE* SKRFiles::OpenRegularFileForReading(const char* path, std::uint64_t maxSize) noexcept {
-  const int fd = Retry([&] { return ::open(path, O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK); });
+  std::size_t size = 0;
+  const int fd = OpenRegular(path, maxSize, size);
   if (fd < 0)
     return nullptr;
-  struct stat info {};
-  const int status = ::fcntl(fd, F_GETFL);
-  if (::fstat(fd, &info) != 0 || !S_ISREG(info.st_mode) || info.st_size < 0 ||
-      std::uint64_t(info.st_size) > maxSize || status < 0 || ::fcntl(fd, F_SETFL, status & ~O_NONBLOCK) != 0) {
-    ::close(fd);
-    return nullptr;
-  }
   std::FILE* stream = ::fdopen(fd, "rb");
   if (stream == nullptr)
     ::close(fd);
